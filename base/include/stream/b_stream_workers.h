@@ -1,0 +1,42 @@
+#pragma once
+
+#include "stream/b_stream.h"
+
+/// The workers that lie in memory or stand on another stream.
+namespace base {
+
+/// Capability words of memory streams.
+constexpr u32 growingMemoryCapabilities = 127;
+constexpr u32 memoryViewCapabilities = 109;
+
+/// A zero-filled block of `byteCount` bytes that the stream owns and grows.
+BASE1_API Stream memStream(u64 byteCount, string name = "memory");
+/// An owned copy of everything in `source`, which is read in one go from its present position.
+BASE1_API Stream memStream(Stream& source);
+/// A read-only view of foreign memory, which must outlive the stream.
+BASE1_API Stream memStreamView(const void* data, u64 byteCount, string name);
+
+/// One block of a chain of foreign memory.
+struct MemBlock {
+    void* data;
+    u64 byteCount;
+    MemBlock* next;
+};
+/// Reads and writes a chain of foreign blocks, which must outlive the stream; it can't grow.
+BASE1_API Stream memBlockStream(MemBlock* first, string name);
+
+/// Grows a container of the caller's, which must outlive the stream. The position starts at 0.
+BASE1_API Stream vectorStream(vector<u8>& bytes, string name = "vector");
+BASE1_API Stream stringStream(string& text, string name = "string");
+
+/// A window of `parent`, which it keeps open. `length` is cut to the bytes that remain. Throws
+/// `exception` if `offset` lies past the parent's end.
+BASE1_API Stream subStream(Stream& parent, u64 offset, u64 length);
+
+enum class BufferMode : u32 { read, write };
+/// A buffer of `byteCount` bytes in front of `inner`, which it keeps open. Pending bytes go out
+/// in one write when the buffer is full, on `flush` and on closing; the flags of `inner` at
+/// creation decide whether a short write throws then.
+BASE1_API Stream bufferedStream(Stream& inner, u64 byteCount, BufferMode mode);
+
+} // namespace base
