@@ -3,8 +3,6 @@
 #include "b_attribute_path.h"
 #include "b_type_traits.h"
 
-#include <atomic>
-
 /// The attribute classes: named typed values with flags. Their container is in
 /// `b_attribute_map.h`.
 ///
@@ -18,20 +16,20 @@ class AttribMap;
 
 /// Bits of an attribute's flags word, by position.
 enum AttribFlag : u32 {
-    attribUntracked = 1u << 0,       ///< enters no weak-link chain; paths resolve it on each use
-    attribSilentLink = 1u << 7,      ///< an unresolved link is not reported
-    attribPluginMark = 1u << 10,     ///< set by `IPlugin::markCreated`
-    attribNoTargets = 1u << 11,      ///< a morph with it is exported without targets
-    attribMergeOnAssign = 1u << 28,  ///< an assign that does not replace merges element by element
+    attribUntracked = 1u << 0,        ///< enters no weak-link chain; paths resolve it on each use
+    attribSilentLink = 1u << 7,       ///< an unresolved link is not reported
+    attribPluginMark = 1u << 10,      ///< set by `IPlugin::markCreated`
+    attribNoTargets = 1u << 11,       ///< a morph with it is exported without targets
+    attribMergeOnAssign = 1u << 28,   ///< an assign that does not replace merges element by element
     attribMergeDuplicates = 1u << 29, ///< with the former: keeps duplicate elements
     attribAnimated = 1u << 30,
-    attribTransient = 1u << 31,      ///< is never written
+    attribTransient = 1u << 31, ///< is never written
 };
 
 /// Bits of the mode of `assign`.
 enum AssignMode : u32 {
     assignAdopt = 0,
-    assignCopy = 1u << 0,  ///< replace
+    assignCopy = 1u << 0, ///< replace
     assignMerge = 1u << 1,
 };
 
@@ -46,13 +44,17 @@ public:
     const AttribLink* asLink() const { return const_cast<Attribute*>(this)->asLink(); }
     const AttribArray* asArray() const { return const_cast<Attribute*>(this)->asArray(); }
     const AttribMap* asMap() const { return const_cast<Attribute*>(this)->asMap(); }
-    /// Deep copy with the same flags word; the caller owns it. Throws beyond 256 levels.
+    /// Deep copy with the same flags word; the caller owns it (but see `IPlugin::clone`). Throws
+    /// `exception` if maps and arrays lie in each other deeper than 256 levels.
     virtual Attribute* clone() const = 0;
     /// The scalar element of the value: 0 bool, 1 u8, 2 i8, 3 u16, 4 i16, 5 u32 and plugin
     /// references, 6 i32, 8 TimeCode, 10 float, 11 double, -1 for everything else. Composite
     /// values answer for their component.
     virtual i8 elementCode() const = 0;
-    /// Address of the whole value (-1) or of one element of it.
+    /// Address of the whole value (-1) or of one element of it: a component of a scalar (index 0
+    /// of a value without components is the value), an element of a vector, the value of the
+    /// attribute in an array or map. Null for an index without element. Asking for an element of
+    /// a vector that is a view makes its elements its own, since they may be written.
     virtual void* data(i32 index = -1) = 0;
     const void* data(i32 index = -1) const { return const_cast<Attribute*>(this)->data(index); }
     /// Elements held: 1 for a scalar, else the length of the vector, array or map.
@@ -66,31 +68,36 @@ public:
     /// Text form: components with a blank between, vectors of up to four elements joined by
     /// ", ", longer ones as type and count.
     virtual string toString() const;
-    /// Reads the text form back; false if the text is none.
+    /// Reads the text form back, of the whole value or of one element (see `data`). False, and
+    /// the value unchanged, if the text is none or the class has no text form.
     virtual bool fromString(string_view text, i32 index = -1);
     virtual bool isAnimated() const;
-    /// Stores a value of the attribute's own type, or one element of it.
+    /// Stores a value of the attribute's own type, as `data(-1)` of another one gives it, or one
+    /// element of it. An index without element is ignored. Maps and arrays store deep copies.
     virtual void setData(const void* value, i32 index = -1) = 0;
-    /// -1, 0 or 1: 0 when equal, -1 when the argument is greater.
+    /// -1, 0 or 1: 0 when equal, -1 when the argument is greater (also when there is no element
+    /// at `index`), else 1. A NaN on either side gives 1.
     virtual i32 compare(const void* value, i32 index = -1) const = 0;
-    /// Hash of a vector's bytes; 0 for scalars.
+    /// XXH32 with seed 0 of a vector's bytes as they are stored in files; 0 for everything else.
     virtual u32 hash() const;
 
     u32 flags() const noexcept { return flags_; }
     void setFlags(u32 flags) noexcept { flags_ = flags; }
     bool hasFlag(AttribFlag flag) const noexcept { return (flags_ & flag) != 0; }
+    /// True if a weak link points at this attribute.
+    bool hasWeakLinks() const noexcept { return weakHead_ != nullptr; }
 
 protected:
     explicit Attribute(u32 flags = 0) : flags_(flags) {}
+    /// Sets every weak link that points here to null.
+    void clearWeakLinks() noexcept;
+    ReadWriteSpinLock& weakLock() const noexcept { return weakLock_; }
 
 private:
     friend class AttribWeakLink;
     AttribWeakLink* weakHead_ = nullptr;
     u32 flags_;
     mutable ReadWriteSpinLock weakLock_;
-
-protected:
-    ReadWriteSpinLock& weakLock() const noexcept { return weakLock_; }
 };
 
 /// One value of type T, held in place.
@@ -150,12 +157,23 @@ protected:
     vector<T> value_;
 };
 
+// All of them are compiled in `base1` alone. The visibility is repeated because the one of the
+// template does not reach instantiations over types that are not exported themselves.
+#define BASE_EXTERN_SCALAR_ROW(T, text) extern template class BASE1_API TypedAttribute<T>;
+#define BASE_EXTERN_ARRAY_ROW(T, text) extern template class BASE1_API TypedVectorAttribute<T>;
+BASE_FULL_TYPES(BASE_EXTERN_SCALAR_ROW)
+BASE_FULL_TYPES(BASE_EXTERN_ARRAY_ROW)
+BASE_SCALAR_TYPES(BASE_EXTERN_SCALAR_ROW)
+BASE_ARRAY_TYPES(BASE_EXTERN_ARRAY_ROW)
+
 /// Reference to a plugin object and the path that found it.
 class BASE1_API PluginAttribute final : public TypedAttribute<ref<IPlugin>> {
 public:
     using TypedAttribute::TypedAttribute;
     ~PluginAttribute() override;
     Attribute* clone() const override;
+    /// Takes over the path as well.
+    bool assign(const Attribute& other, u32 mode, i32 index = -1) override;
 
     AttribPath path; ///< empty unless the reference was found by a path
 };
@@ -179,7 +197,6 @@ public:
     using Attribute::asArray;
     Attribute* clone() const override;
     i8 elementCode() const override { return -1; }
-    /// -1: the vector of pointers; else the value address of that element, null for none.
     void* data(i32 index = -1) override;
     using Attribute::data;
     u32 size() const override { return static_cast<u32>(items_.size()); }
@@ -211,7 +228,8 @@ private:
     name_id typeName_;
 };
 
-/// Alias of another attribute, reached by a path.
+/// Alias of another attribute, reached by a path. Its own value is the path: accessors of a map
+/// follow it to the target.
 class BASE1_API AttribLink final : public Attribute {
 public:
     AttribLink() = default;
@@ -238,7 +256,6 @@ public:
 
 private:
     AttribPath path_;
-    AttribPath textPath_;
 };
 
 /// Makes attributes by type name. The process-wide one knows every type of `b_type_traits`, "map",
@@ -260,12 +277,5 @@ private:
 };
 
 BASE1_API AttribFactory& attribFactory();
-
-#define BASE_EXTERN_SCALAR_ROW(T, text) extern template class TypedAttribute<T>;
-#define BASE_EXTERN_ARRAY_ROW(T, text) extern template class TypedVectorAttribute<T>;
-BASE_FULL_TYPES(BASE_EXTERN_SCALAR_ROW)
-BASE_FULL_TYPES(BASE_EXTERN_ARRAY_ROW)
-BASE_SCALAR_TYPES(BASE_EXTERN_SCALAR_ROW)
-BASE_ARRAY_TYPES(BASE_EXTERN_ARRAY_ROW)
 
 } // namespace base

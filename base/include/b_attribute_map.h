@@ -6,12 +6,13 @@
 namespace base {
 
 /// Owns attributes under their names, sorted by the names' handles: iteration follows no textual
-/// order. A map may have a parent that supplies what it lacks itself.
+/// order. A map may have a parent that supplies what it lacks itself, for the finding functions.
 ///
 /// Every access function checks its name first and throws `exception` "The attribute name can't
 /// be an empty string." for an absent or empty one. Finding functions answer null for what is
 /// absent; of a wrong type or a link that leads nowhere they log one warning and answer null.
-/// A missing attribute means the schema's default and is never an error there.
+/// A missing attribute means the schema's default and is never an error there. A link with the
+/// flag `attribSilentLink` breaks in silence.
 class BASE1_API AttribMap : public Attribute {
 public:
     using Entry = std::pair<name_id, Attribute*>;
@@ -24,7 +25,6 @@ public:
     using Attribute::asMap;
     Attribute* clone() const override;
     i8 elementCode() const override { return -1; }
-    /// -1: the vector of entries; else the value address of that entry's attribute.
     void* data(i32 index = -1) override;
     using Attribute::data;
     u32 size() const override { return static_cast<u32>(entries_.size()); }
@@ -40,8 +40,13 @@ public:
     // Asked by the path machinery; answered by plugin objects that drive attributes.
     virtual bool reservedQuery() const;
     virtual bool isPathKeyed(const AttribPath& path) const;
+    /// Asked by `isAnimated` of a link whose path starts at this object.
     virtual bool isPathAnimated(const AttribPath& path) const;
     virtual bool isPathDriven(const AttribPath& path) const;
+    /// Mode 0: a link is about to read what `path`, which starts at this object, names, and it is
+    /// missing or untracked; the object may bring it up to date. Not called again for this object
+    /// while it works on that. Other modes: what `path` names is about to change, see
+    /// `findAttributeMutable`.
     virtual void pathChanged(const AttribPath& path, u32 mode);
     virtual void pathResolved(const AttribPath& path, u32 a, u32 b, u32 c);
     virtual bool pathIsLinked(const AttribPath& path, u32 x) const;
@@ -60,8 +65,9 @@ public:
     Attribute* findAttribute(name_id name, bool followLinks = true, bool inherit = true) const;
     AttribMap* findMap(name_id name, bool followLinks = true, bool inherit = true) const;
     AttribArray* findArray(name_id name, bool followLinks = true, bool inherit = true) const;
-    /// As `findAttribute`, and then tells the owning objects of a change: mode bit 0 through the
-    /// link chain, bit 1 through the plugin that holds this map.
+    /// As `findAttribute`, for changing what it finds: tells the objects concerned by `pathChanged`
+    /// with a mode of that bit alone. Bit 0 of `mode` tells the object at the root of each link on
+    /// the way, bit 1 this map, if it is a plugin object.
     Attribute* findAttributeMutable(name_id name, u32 mode = 3, bool followLinks = true,
                                     bool inherit = true);
 
@@ -70,8 +76,9 @@ public:
     template <class T>
     const vector<T>* findVecAttribute(name_id name) const;
 
-    /// The value under `name`, made with its type's zero if absent. Follows links. Throws on a
-    /// type mismatch and on a type that the factory does not know.
+    /// The value under `name` in this map itself, made with its type's zero if absent. Follows
+    /// links. Throws on a type mismatch, for which a link that leads nowhere counts, and on a type
+    /// that the factory does not know.
     template <class T>
     T& attribute(name_id name);
     /// The same for a vector.
@@ -85,8 +92,9 @@ public:
     /// If an attribute of the same type is there, it takes over the value and keeps its flags,
     /// and `a` is deleted; one of another type is replaced.
     void attribute(name_id name, Attribute* a);
-    /// The array of maps under `name`, made if absent, grown to at least `count` maps that share
-    /// this map's factory. Returns the first element; null if `count` is 0.
+    /// The array of maps under `name` in this map itself, made in place of anything else, grown to
+    /// at least `count` maps that share this map's factory. Returns the first element, null if
+    /// `count` is 0 or that element is no map.
     AttribMap* attribute(u32 count, name_id name);
 
     /// Binds `value` to the attribute: takes its value over if it exists, else makes it with
@@ -103,9 +111,29 @@ protected:
     void takeEntries(AttribMap& other);
 
 private:
-    Attribute* findTyped(name_id name, name_id type, bool vectorForm) const;
+    friend class AttribPath;
+    const Entry* lowerBound(name_id name) const noexcept {
+        return std::lower_bound(
+            entries_.begin(), entries_.end(), name,
+            [](const Entry& entry, name_id wanted) { return entry.first < wanted; });
+    }
+    /// The attribute under `name` in this map itself, links not followed.
+    Attribute* findOwn(name_id name) const noexcept {
+        const Entry* at = lowerBound(name);
+        return at != entries_.end() && at->first == name ? at->second : nullptr;
+    }
+    /// The same in the first parent that has it.
+    Attribute* findInherited(name_id name) const noexcept;
+    Attribute* followReported(Attribute* a, name_id name) const;
+    const Attribute* findTyped(name_id name, name_id type, bool vectorForm) const;
+    /// Puts `a` under `name`, of which the map has none yet.
+    Attribute& insert(name_id name, std::unique_ptr<Attribute> a);
+    /// Puts `a` under `name`, deleting what was there.
+    void replace(name_id name, std::unique_ptr<Attribute> a);
+    Attribute& make(name_id name, name_id type, const char* function);
     Attribute& requireTyped(name_id name, name_id type, const char* function);
     Attribute* syncTyped(name_id name, name_id type, bool& made);
+    void merge(AttribMap& donor, u32 mode);
 
     vector<Entry> entries_;
     name_id typeName_;
@@ -134,7 +162,7 @@ T& AttribMap::attribute(name_id name) {
 template <class T>
 vector<T>& AttribMap::vecAttribute(name_id name) {
     return *static_cast<vector<T>*>(
-        requireTyped(name, TypeTraits<T>::n_array_name, "base::AttribMap::attribute").data(-1));
+        requireTyped(name, TypeTraits<T>::n_array_name, "base::AttribMap::vecAttribute").data(-1));
 }
 
 template <class T>

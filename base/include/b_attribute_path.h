@@ -1,38 +1,24 @@
 #pragma once
 
 #include "b_containers.h"
+#include "b_lock.h"
 #include "b_name.h"
-#include "b_refcnt.h"
-
-#include <atomic>
 
 /// Paths that lead from a plugin object to one of its attributes, and the weak links they are
 /// made of.
 namespace base {
 
 class Attribute;
+class AttribLink;
 class IPlugin;
-
-/// Lock word for many readers or one writer. The low 30 bits count readers, bit 30 marks a
-/// waiting writer; a writer holds the word at that mark with no readers.
-class BASE1_API ReadWriteSpinLock : public NonCopyable {
-public:
-    void lockRead() noexcept;
-    void unlockRead() noexcept;
-    void lockWrite() noexcept;
-    void unlockWrite() noexcept;
-
-private:
-    std::atomic<u32> word_{0};
-};
 
 /// Pointer to an attribute that is cleared when the attribute dies. An attribute with the flag
 /// `attribUntracked` is never stored.
 class BASE1_API AttribWeakLink {
 public:
     AttribWeakLink() = default;
-    AttribWeakLink(const AttribWeakLink& other) { set(other.target_); }
-    AttribWeakLink& operator=(const AttribWeakLink& other) {
+    AttribWeakLink(const AttribWeakLink& other) noexcept { set(other.target_); }
+    AttribWeakLink& operator=(const AttribWeakLink& other) noexcept {
         set(other.target_);
         return *this;
     }
@@ -40,7 +26,7 @@ public:
 
     Attribute* target() const noexcept { return target_; }
     /// Leaves the chain of the old target and enters that of the new one.
-    void set(Attribute* target);
+    void set(Attribute* target) noexcept;
 
 private:
     friend class Attribute;
@@ -64,7 +50,7 @@ struct PathStep {
 };
 
 /// Steps from a plugin (the root step) to an attribute. A path survives its target: it resolves
-/// again by names and indices.
+/// again by names and indices. Maps and arrays on the way may be reached through links.
 class BASE1_API AttribPath {
 public:
     AttribPath() = default;
@@ -72,6 +58,8 @@ public:
     explicit AttribPath(IPlugin& root);
     /// The path of the attribute `name` of `root`.
     AttribPath(IPlugin& root, name_id name);
+
+    // Each appends a step and returns the path.
 
     AttribPath& attribute(name_id name);
     AttribPath& element(u32 index);
@@ -81,11 +69,12 @@ public:
     const vector<PathStep>& steps() const noexcept { return steps_; }
     /// The plugin of the root step, null if it is gone or the path is empty.
     IPlugin* root() const noexcept;
-    /// Points the root step at another object.
+    /// Points the root step at another object; the steps behind it resolve anew.
     void setRoot(IPlugin& root);
 
-    /// The attribute at the resolving end: the last step, or the one before a component step.
-    /// Stored targets are used and refreshed. Null if some step leads nowhere.
+    /// The attribute at the resolving end: the last step, or the one before a component step. A
+    /// link found there is followed to its end. Stored targets are used and refreshed. Null if
+    /// some step leads nowhere or more than 64 links are on the way; nothing is logged.
     Attribute* resolve() const;
 
     /// "Plugin[12]" followed by ".name", "[3]" and "{0}" for the step kinds; a backslash escapes
@@ -96,6 +85,9 @@ public:
     friend BASE1_API bool operator==(const AttribPath& a, const AttribPath& b);
 
 private:
+    friend Attribute* linkTarget(const AttribLink& link, u32& hopsLeft);
+    Attribute* resolveStep(u32& hopsLeft) const;
+
     mutable vector<PathStep> steps_;
 };
 

@@ -13,24 +13,24 @@ public:
     static constexpr u32 mayRepeat = 1u << 1;
 
     ~CmdLineOption() override;
-    /// Text for the list of options: names, default and help.
+    /// Lines for a list of options: names, syntax and default on the first, below it the help
+    /// text, indented.
     virtual string help() const = 0;
-    /// Takes `tokens` as the values given under `name`; what is wrong with them is appended to
-    /// `errors` and leaves the option unset.
-    virtual void parse(string_view name, const vector<string>& tokens,
-                       vector<string>& errors) = 0;
-    /// The name and each value, joined by blanks.
+    /// Takes `tokens` as the values given under `name`, which appears in messages. What is wrong
+    /// with them is appended to `errors` as one text, and the option stays as it was.
+    virtual void parse(string_view name, const vector<string>& tokens, vector<string>& errors) = 0;
+    /// The option's name and each value, joined by blanks.
     virtual string toString() const = 0;
 
     CmdLineOption* parent = nullptr;
     string name;
-    string shortName;
+    string shortName; ///< empty for none
     string helpText;
-    string syntax;
-    string defaultText;
-    bool seen = false;
+    bool seen = false; ///< set by `parse`
     u32 flags = 0;
     u32 valueCount = 1; ///< values it needs
+    string syntax;      ///< of the values, for messages; empty for none
+    string defaultText; ///< for the list of options; empty for none
 };
 
 /// An option with values of type T: bool, float, u32, u8 or string.
@@ -42,8 +42,8 @@ public:
     void parse(string_view name, const vector<string>& tokens, vector<string>& errors) override;
     string toString() const override;
 
-    vector<string> tokens;
-    vector<T> values;
+    vector<string> tokens; ///< as given
+    vector<T> values;      ///< one for each token; empty while the option is not seen
 };
 
 extern template class CmdLineValue<bool>;
@@ -61,8 +61,8 @@ struct CmdLineGroup {
 class BASE1_API CmdLineOptions {
 public:
     /// Adds an option to `group`. A nameless option is logged and left out; one whose name or
-    /// short name is taken in any group (a leading "-" does not count) is left out silently.
-    /// Null then, else the option, owned by the registry.
+    /// short name is taken in any group (a leading "-" does not count) is left out silently:
+    /// null in both cases. The option belongs to the registry. T is a type of `CmdLineValue`.
     template <class T>
     CmdLineValue<T>* add(string_view group, string_view name, string_view shortName,
                          string_view helpText, const T& defaultValue);

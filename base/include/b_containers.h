@@ -3,11 +3,15 @@
 #include "b_memory.h"
 
 #include <algorithm>
+#include <cstddef>
+#include <cstdint>
 #include <cstring>
 #include <functional>
 #include <initializer_list>
+#include <iterator>
 #include <map>
 #include <memory>
+#include <new>
 #include <set>
 #include <string>
 #include <string_view>
@@ -37,8 +41,9 @@ using hash_map = std::unordered_map<K, V, Hash, Equal>;
 /// move keeps it a view. The viewed memory must outlive the view.
 ///
 /// Elements are value-initialised by `resize`; `resizeUninitialized` leaves trivial elements
-/// as they come, for arrays that are filled at once. Strong guarantee for `reserve`, `push_back`
-/// and `resize` of types whose move does not throw.
+/// as they come, for arrays that are filled at once. A call that throws leaves the elements as they
+/// were, except `assign`, `insert` and `erase`, which may leave fewer. Elements need a move that
+/// does not throw.
 template <class T>
 class vector {
     static constexpr bool trivial = std::is_trivially_copyable_v<T>;
@@ -53,14 +58,15 @@ public:
     using const_iterator = const T*;
 
     vector() noexcept = default;
-    explicit vector(size_type count) { resize(count); }
-    vector(size_type count, const T& value) { resize(count, value); }
-    vector(std::initializer_list<T> values) { assign(values.begin(), values.end()); }
+    // These delegate, so that the destructor runs if an element's copy throws.
+    explicit vector(size_type count) : vector() { resize(count); }
+    vector(size_type count, const T& value) : vector() { resize(count, value); }
+    vector(std::initializer_list<T> values) : vector() { append(values.begin(), values.end()); }
     template <class It, class = typename std::iterator_traits<It>::iterator_category>
-    vector(It first, It last) {
-        assign(first, last);
+    vector(It first, It last) : vector() {
+        append(first, last);
     }
-    vector(const vector& other) { assign(other.begin(), other.end()); }
+    vector(const vector& other) : vector() { append(other.begin(), other.end()); }
     vector(vector&& other) noexcept { swap(other); }
     vector& operator=(const vector& other) {
         if (this != &other)
@@ -90,40 +96,39 @@ public:
     /// Turns this into a view of [first, last), releasing what it held. A range that ends at or
     /// before its start is empty; a range not aligned for T becomes an owned copy.
     void setView(const T* first, const T* last) {
+        static_assert(trivial);
         release();
         if (last <= first)
             return;
         if (reinterpret_cast<std::uintptr_t>(first) % alignof(T) != 0) {
-            if constexpr (trivial) {
-                const auto count = static_cast<size_type>(last - first);
-                reserve(count);
-                std::memcpy(static_cast<void*>(begin_), first, count * sizeof(T));
-                end_ = begin_ + count;
-            }
+            const size_type byteCount =
+                reinterpret_cast<std::uintptr_t>(last) - reinterpret_cast<std::uintptr_t>(first);
+            resizeUninitialized(byteCount / sizeof(T));
+            std::memcpy(static_cast<void*>(begin_), static_cast<const void*>(first), byteLength());
             return;
         }
         begin_ = capacityEnd_ = const_cast<T*>(first);
         end_ = const_cast<T*>(last);
     }
 
-    bool isView() const noexcept { return end_ > begin_ && capacityEnd_ <= begin_; }
+    bool isView() const noexcept { return capacityEnd_ == begin_ && end_ != begin_; }
 
     const T* begin() const noexcept { return begin_; }
-    const T* end() const noexcept { return end_ > begin_ ? end_ : begin_; }
+    const T* end() const noexcept { return end_; }
     const T* data() const noexcept { return begin_; }
     T* begin() { return own(); }
-    T* end() { return own() + size(); }
+    T* end() {
+        own();
+        return end_;
+    }
     T* data() { return own(); }
     const T* cbegin() const noexcept { return begin(); }
     const T* cend() const noexcept { return end(); }
 
-    size_type size() const noexcept {
-        return end_ > begin_ ? static_cast<size_type>(end_ - begin_) : 0;
-    }
-    bool empty() const noexcept { return end_ <= begin_; }
-    size_type capacity() const noexcept {
-        return capacityEnd_ > begin_ ? static_cast<size_type>(capacityEnd_ - begin_) : 0;
-    }
+    size_type size() const noexcept { return static_cast<size_type>(end_ - begin_); }
+    bool empty() const noexcept { return end_ == begin_; }
+    /// Elements that fit into the owned storage; 0 for a view.
+    size_type capacity() const noexcept { return static_cast<size_type>(capacityEnd_ - begin_); }
     /// Bytes of the elements, without what they point at.
     size_type byteLength() const noexcept { return size() * sizeof(T); }
 
@@ -146,7 +151,7 @@ public:
         resizeWith(count, [](T* at, size_type n) { std::uninitialized_value_construct_n(at, n); });
     }
     void resize(size_type count, const T& value) {
-        const T kept = value; // `value` may be one of the elements that move
+        const T kept = value; // `value` may be an element of this vector
         resizeWith(count, [&](T* at, size_type n) { std::uninitialized_fill_n(at, n, kept); });
     }
     /// As `resize`, but new elements keep whatever the memory held. For trivial types alone.
@@ -161,7 +166,7 @@ public:
             begin_ = end_ = capacityEnd_ = nullptr;
             return;
         }
-        std::destroy(begin_, begin_ + size());
+        std::destroy(begin_, end_);
         end_ = begin_;
     }
 
@@ -169,18 +174,21 @@ public:
     void push_back(T&& value) { emplace_back(std::move(value)); }
     template <class... Args>
     T& emplace_back(Args&&... args) {
-        if (end_ >= capacityEnd_) {
-            T made(std::forward<Args>(args)...); // an argument may lie in the old storage
-            reallocate(grown());
-            return *std::construct_at(end_++, std::move(made));
+        if (end_ < capacityEnd_) {
+            T* at = std::construct_at(end_, std::forward<Args>(args)...);
+            ++end_;
+            return *at;
         }
-        return *std::construct_at(end_++, std::forward<Args>(args)...);
+        T made(std::forward<Args>(args)...); // an argument may lie in the old storage
+        reallocate(grown());
+        return *std::construct_at(end_++, std::move(made));
     }
     void pop_back() {
         own();
         std::destroy_at(--end_);
     }
 
+    /// The elements become copies of [first, last), which must not lie in this vector.
     template <class It>
     void assign(It first, It last) {
         clear();
@@ -193,8 +201,7 @@ public:
         const auto count = static_cast<size_type>(std::distance(first, last));
         if (count == 0)
             return;
-        if (isView() || size() + count > capacity())
-            reallocate(std::max(size() + count, size() == 0 ? 0 : grown()));
+        growFor(size() + count);
         std::uninitialized_copy(first, last, end_);
         end_ += count;
     }
@@ -210,6 +217,8 @@ public:
         const auto at = first - begin_;
         const auto count = last - first;
         own();
+        if (count == 0)
+            return begin_ + at;
         T* kept = std::move(begin_ + at + count, end_, begin_ + at);
         std::destroy(kept, end_);
         end_ = kept;
@@ -235,42 +244,42 @@ private:
 
     size_type grown() const noexcept { return std::max<size_type>(4, size() + size() / 2); }
 
+    /// Makes owned room for `count` elements: exactly that at first, later in steps that keep
+    /// repeated growth linear.
+    void growFor(size_type count) {
+        if (isView() || count > capacity())
+            reallocate(std::max(count, empty() ? 0 : grown()));
+    }
+
     template <class Fill>
     void resizeWith(size_type count, Fill fill) {
         const size_type old = size();
-        if (count > capacity() || isView())
-            reallocate(count > old ? std::max(count, old == 0 ? 0 : std::min(grown(), 2 * count))
-                                   : old);
-        if (count < old)
-            std::destroy(begin_ + count, begin_ + old);
-        else
-            fill(begin_ + old, count - old);
+        if (count > old) {
+            growFor(count);
+            fill(end_, count - old);
+        } else if (count < old) {
+            own();
+            std::destroy(begin_ + count, end_);
+        }
         end_ = begin_ + count;
     }
 
     /// Moves (or, from a view, copies) the elements into owned storage for `count`.
     void reallocate(size_type count) {
+        static_assert(std::is_nothrow_move_constructible_v<T> && alignof(T) <= 16);
         const size_type n = size();
         if (count > static_cast<size_type>(-1) / 2 / sizeof(T))
             throw std::bad_alloc();
         T* fresh = static_cast<T*>(AllocPolicy::allocate(count * sizeof(T)));
-        if (isView()) {
-            try {
-                std::uninitialized_copy_n(begin_, n, fresh);
-            } catch (...) {
-                AllocPolicy::free(fresh);
-                throw;
-            }
+        if constexpr (trivial) {
+            if (n != 0)
+                std::memcpy(static_cast<void*>(fresh), begin_, n * sizeof(T));
         } else {
-            if constexpr (trivial) {
-                if (n != 0)
-                    std::memcpy(static_cast<void*>(fresh), begin_, n * sizeof(T));
-            } else {
-                std::uninitialized_move_n(begin_, n, fresh);
-                std::destroy_n(begin_, n);
-            }
-            AllocPolicy::free(begin_);
+            std::uninitialized_move_n(begin_, n, fresh);
+            std::destroy_n(begin_, n);
         }
+        if (!isView())
+            AllocPolicy::free(begin_);
         begin_ = fresh;
         end_ = fresh + n;
         capacityEnd_ = fresh + count;
@@ -278,7 +287,7 @@ private:
 
     void release() noexcept {
         if (!isView()) {
-            std::destroy(begin_, begin_ + size());
+            std::destroy(begin_, end_);
             AllocPolicy::free(begin_);
         }
         begin_ = end_ = capacityEnd_ = nullptr;

@@ -12,8 +12,8 @@ namespace base {
 
 class ILog;
 
-/// An error with its text and the place that raised it. `file` is the subject of a source ("b_stream"),
-/// not a path, `function` the qualified name of the operation.
+/// An error with its text and the place that raised it. `file` is the subject of a source
+/// ("b_stream"), not a path, `function` the qualified name of the operation.
 class BASE1_API exception : public std::exception {
 public:
     explicit exception(string text, const char* file = nullptr, const char* function = nullptr,
@@ -22,13 +22,17 @@ public:
     exception& operator=(const exception&);
     ~exception() override;
     const char* what() const noexcept override;
-    /// Writes the error to `log`: text, file and line, function, and the call stack if one was
-    /// taken; on the system channel, level 2.
+    /// Writes the error to `log`: text, file and line, function, and the call stack if there is
+    /// one; on the system channel, level 2.
     virtual void report(ILog& log) const;
 
     const char* file() const noexcept { return file_; }
     const char* function() const noexcept { return function_; }
     int line() const noexcept { return line_; }
+
+    /// The call stack at the place that raised the error; empty where nothing recorded it.
+    const string& callStack() const noexcept { return callStack_; }
+    void setCallStack(string text) { callStack_ = std::move(text); }
 
 protected:
     /// The shared end of `report`: the call stack, if there is one.
@@ -42,12 +46,12 @@ private:
     string callStack_;
 };
 
-/// A call to the operating system failed.
+/// A call to the operating system failed. `what()` is the plain text; `report` adds the code.
 class BASE1_API api_exception : public exception {
 public:
     /// `code` is the value of `errno`.
-    api_exception(string text, int code, const char* file = nullptr,
-                  const char* function = nullptr, int line = 0);
+    api_exception(string text, int code, const char* file = nullptr, const char* function = nullptr,
+                  int line = 0);
     ~api_exception() override;
     void report(ILog& log) const override;
     int code() const noexcept { return code_; }
@@ -79,8 +83,8 @@ public:
 /// "Invalid string conversion"
 class BASE1_API string_conversion_exception : public exception {
 public:
-    explicit string_conversion_exception(const char* file = nullptr,
-                                         const char* function = nullptr, int line = 0);
+    explicit string_conversion_exception(const char* file = nullptr, const char* function = nullptr,
+                                         int line = 0);
     ~string_conversion_exception() override;
 };
 

@@ -2,6 +2,7 @@
 
 #include "b_attribute_map.h"
 
+#include <memory>
 #include <mutex>
 
 /// Objects with identity (plugins), the descriptions of their types, and the factory that owns
@@ -37,7 +38,7 @@ public:
 
     u32 reserved = 0;
     i32 version = 0; ///< negative marks the dummy of an unknown type
-    name_id type;     ///< the type's name; "Plugin" until the concrete description sets it
+    name_id type;    ///< the type's name; "Plugin" until the concrete description sets it
     string author;
     i32 group = 0;
     string info;
@@ -60,8 +61,8 @@ public:
     IPlugin(ref<IPluginDesc> desc, PluginFactory* factory, u32 id);
     ~IPlugin() override;
 
-    /// A new object of the same type from the same factory with clones of all attributes; a
-    /// plain map where description or factory is missing.
+    /// A new object of the same type from the same factory, which owns it, with clones of all
+    /// attributes. A plain map, which the caller owns, where description or factory is missing.
     Attribute* clone() const override;
     /// The object's name.
     string toString() const override;
@@ -93,6 +94,8 @@ public:
     u32 id() const noexcept { return id_; }
 
 protected:
+    /// Deletes the object, at once or, if that happens while another object is being deleted on
+    /// this thread, right after that one: chains of objects end without recursion.
     void destroy() override;
 
 private:
@@ -103,7 +106,11 @@ private:
     ref<IPluginDesc> desc_;
     PluginFactory* factory_;
     u32 id_;
-    mutable ReadWriteSpinLock pathLock_;
+    mutable ReadWriteSpinLock pathLock_; ///< held shared while a path resolves through this object
+    // Place among the living objects of the factory, listed or not.
+    IPlugin* previousObject_ = nullptr;
+    IPlugin* nextObject_ = nullptr;
+    IPlugin* nextDying_ = nullptr;
 };
 
 /// True if `plugin` is the inert stand-in for an object of an unknown type.
@@ -126,7 +133,7 @@ public:
 
 class PluginEnum {};
 
-/// Performs creations and removals and keeps a record of them.
+/// Performs creations and removals and keeps a record of those that can be undone.
 class BASE1_API PluginPatch : public NonCopyable {
 public:
     enum class Operation : u8 { create, remove };
@@ -176,28 +183,42 @@ public:
     /// Makes an object of `type` and adds it, see `CreateFlag`. An unknown type gives a dummy
     /// object unless `createNoDummy` is set.
     ref<IPlugin> create(name_id type, u32 flags = 0);
-    /// Gives the object the next id and appends it.
+    /// Gives the object the next id, appends it and makes this its factory. The object must not be
+    /// in a list already; null throws.
     void addPlugin(const ref<IPlugin>& plugin, u32 flags = 0);
     /// Makes an object in the place of a removed one; null if `id` is out of range or taken.
     ref<IPlugin> createAt(name_id type, u32 id);
     /// As `create` through the root patch; marks the object as created.
     ref<IPlugin> createPatched(name_id type, bool undoable);
-    /// Removes the object; unless `keepLinks` every reference to it is cleared.
+    /// Takes the object off the list; its id is `IPlugin::noId` then and its factory stays. Unless
+    /// `keepLinks`, every reference to it is cleared: plugin attributes become null, so do the
+    /// elements of plugin vectors, and paths of links that start at it become empty. That walks
+    /// over all objects, except if the list holds the only counted reference (drop your own
+    /// first) and no weak link points at the object. False for an id without object.
     bool remove(u32 id, bool keepLinks);
-    /// Points every reference to object `id` at `newId`; `IPlugin::noId` clears them.
+    /// Points every reference to object `id` at `newId`; `IPlugin::noId` clears them. `options` are
+    /// not used. False unless both ids are in range and the first has an object.
     bool replace(u32 id, u32 newId, u32 options = 0);
 
     ref<IPlugin> plugin(u32 id) const;
     u32 pluginCount() const noexcept { return static_cast<u32>(plugins_.size()); }
     const vector<ref<IPlugin>>& plugins() const noexcept { return plugins_; }
+    /// The first object by id whose name is `text`, -1 if there is none.
     i32 findByName(string_view text) const;
+    /// The first object by id of exactly this type, -1 if there is none.
     i32 findByType(name_id type) const;
+    /// The same object, null if there is none.
     ref<IPlugin> firstOfType(name_id type) const;
+    /// Sum of `byteSize` over all objects.
     u64 memorySize() const;
+    /// Calls `afterLoad` on the objects from `firstId` up and returns the length of the list.
     u32 afterLoadAll(i32 version, u32 firstId);
+    /// Adds the options of every description, in the order of `descs`.
     void registerOptions(CmdLineOptions& options);
-    /// Copies the objects of `other` into this factory and points references among the copies
-    /// at the copies. An object whose type and name are taken already is logged and skipped.
+    /// Copies the objects of `other` into this factory, with descriptions that are unknown here,
+    /// and points references among the objects of `other` at what stands for them here. A named
+    /// object is logged and skipped if this factory had one of its type and name before; that one
+    /// stands for it.
     void merge(const PluginFactory& other);
 
     /// Listeners are not owned.
@@ -210,14 +231,21 @@ public:
     PluginPatch& rootPatch() noexcept { return *rootPatch_; }
 
 private:
-    void clearReferences(const IPlugin* target, const ref<IPlugin>& replacement);
+    friend class IPlugin;
+    template <class Redirect>
+    void redirectReferences(Redirect redirect);
+    void append(const ref<IPlugin>& plugin);
+    void enlist(IPlugin& object);
+    void delist(IPlugin& object);
 
     AttribMap attributes_;
     map<name_id, ref<IPluginDesc>> descs_;
     vector<ref<IPlugin>> plugins_;
-    vector<weak_ref<IPlugin>> removed_;
     AttribFactory* attribFactory_;
-    std::mutex lock_;
+    // Taken again when making an object makes another one.
+    std::recursive_mutex lock_;
+    SpinLock objectsLock_; ///< guards the chain of `objects_`
+    IPlugin* objects_ = nullptr;
     string name_;
     std::unique_ptr<PluginPatch> rootPatch_;
     vector<ref<IPluginDesc>> dummyDescs_;

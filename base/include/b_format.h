@@ -10,15 +10,18 @@
 namespace base {
 
 /// One argument of `format`: a copy of a number, or a reference to text that must outlive it.
-/// Null texts print as "(null)", reals as attributes print them.
+/// Integers of all widths print as numbers, bool as "true" or "false", null texts as "(null)",
+/// reals as attributes print them. Enumerations and pointers do not convert; callers cast.
 class BASE1_API FormatArg {
 public:
-    FormatArg(bool value) : kind_(Kind::text), text_(value ? "true" : "false") {}
+    template <std::same_as<bool> T>
+    FormatArg(T value) : kind_(Kind::text), text_(value ? "true" : "false") {}
     template <std::signed_integral T>
     FormatArg(T value) : kind_(Kind::integer), integer_(value) {}
     template <std::unsigned_integral T>
-    FormatArg(T value) : kind_(Kind::natural), natural_(value) {}
-    FormatArg(double value) : kind_(Kind::real), real_(value) {}
+    requires(!std::same_as<T, bool>) FormatArg(T value) : kind_(Kind::natural), natural_(value) {}
+    template <std::floating_point T>
+    FormatArg(T value) : kind_(Kind::real), real_(static_cast<double>(value)) {}
     FormatArg(string_view value) : kind_(Kind::text), text_(value) {}
     FormatArg(const string& value) : FormatArg(string_view(value)) {}
     FormatArg(const char* value) : FormatArg(string_view(value ? value : "(null)")) {}

@@ -4,7 +4,6 @@
 #include "b_name.h"
 #include "b_refcnt.h"
 
-#include <array>
 #include <atomic>
 #include <cstdio>
 #include <mutex>
@@ -29,7 +28,7 @@ BASE1_API extern const name_id logSystem; ///< "System"
 BASE1_API extern const name_id logScene;  ///< "Scene"
 BASE1_API extern const name_id logIO;     ///< "IO"
 
-/// Takes messages. Calls never throw: a formatting failure logs the raw pattern.
+/// Takes messages. Logging never throws: a formatting failure logs the raw pattern.
 class BASE1_API ILog : public RefCntAtomic {
 public:
     ~ILog() override;
@@ -56,9 +55,7 @@ public:
 
     /// Greatest level let through.
     int levelLimit() const noexcept { return levelLimit_.load(std::memory_order_relaxed); }
-    void setLevelLimit(int level) noexcept {
-        levelLimit_.store(level, std::memory_order_relaxed);
-    }
+    void setLevelLimit(int level) noexcept { levelLimit_.store(level, std::memory_order_relaxed); }
 
 private:
     void logFormatted(name_id channel, int level, string_view pattern,
@@ -66,37 +63,55 @@ private:
     std::atomic<int> levelLimit_{logInformation};
 };
 
-/// An output. It takes messages of its own channel, or of all if that is `logAll`, up to its own
-/// limit. Outputs are called with the log's lock held and must not log.
+/// An output. Outputs are called with the log's lock held and must not log: what they log all
+/// the same goes to the standard error stream. What they throw is dropped.
 class BASE1_API ICustomLog : public ILog {
 public:
     ~ICustomLog() override;
+    /// Called when the log lets the output go, at the latest at the end of the process: writes
+    /// what ends a file. Does nothing here.
+    virtual void finish();
+    /// True for a message of the output's own channel, or of any if that is `logAll`, up to its
+    /// own limit. The log passes on nothing else.
+    bool takes(name_id messageChannel, int level) const noexcept {
+        return level <= levelLimit() && (channel == logAll || channel == messageChannel);
+    }
+
     name_id channel = logAll;
     u32 indent = 0; ///< in units of two blanks
 };
 
-/// The log: keeps a short history and passes each message to the outputs.
+/// The log: keeps a short history and passes each message to the outputs. Everything takes one
+/// lock and may be called on any thread.
 class BASE1_API Log final : public ILog {
 public:
     Log();
     ~Log() override;
     void message(name_id channel, int level, string_view text) override;
+    /// Passed on unless a task is under way that stands at `percent` already.
     void progress(u32 percent, string_view text) override;
+    /// Passed on if a task is under way.
     void progressEnd() override;
 
+    /// Null is ignored.
     void addOutput(ref<ICustomLog> output);
-    /// False if it was not attached. An output that writes an end to its file does so now.
+    /// Finishes the output; false if it was not attached.
     bool removeOutput(const ICustomLog* output);
+    void removeOutputs();
 
     struct HistoryEntry {
         u64 timeMs = 0;
-        int level = -1; ///< -1 marks a free slot
-        string text;    ///< channel, "| ", message
+        int level = logText;
+        string text; ///< channel, "| ", message
     };
     static constexpr std::size_t historyLength = 64;
-    /// The history, oldest first.
+    /// The last messages of levels 1 to 3, oldest first. Recent errors are not displaced by
+    /// warnings: a full history takes a warning only in the place of one, or of an error that is
+    /// 20 seconds old.
     vector<HistoryEntry> history() const;
+    /// True once a message of level 1 or 2 came.
     bool hasErrors() const noexcept { return sawError_; }
+    /// True once a message of level 3 came.
     bool hasWarnings() const noexcept { return sawWarning_; }
     /// Empties the history and the two marks.
     void reset();
@@ -107,24 +122,26 @@ public:
     string progressText() const;
 
 private:
-    void store(int level, u64 now, string text);
+    void store(name_id channel, int level, string_view text);
 
     mutable std::mutex lock_;
     vector<ref<ICustomLog>> outputs_;
-    u32 historyMask_;
-    std::array<HistoryEntry, historyLength> slots_;
+    vector<HistoryEntry> history_;
     u64 (*clock_)();
     std::atomic<bool> sawError_{false};
     std::atomic<bool> sawWarning_{false};
-    std::atomic<i32> progressCount_{0};
+    bool taskUnderWay_ = false; ///< between `progress` and `progressEnd`
     u32 progressPercent_ = 0;
     string progressText_;
 };
 
-/// Plain text into a C file stream, one line a message, flushed at once.
+/// Plain text into a C file stream, one line a message with the time in front, flushed at once;
+/// coloured by level on a terminal. Progress is not shown.
 class BASE1_API StdLog : public ICustomLog {
 public:
     /// Writes to `file`, which stays the caller's; with null, opens `name` + ".log" and owns it.
+    /// A file that can't be opened is reported on the standard error stream; messages are
+    /// dropped then.
     explicit StdLog(const string& name, std::FILE* file = nullptr);
     ~StdLog() override;
     void message(name_id channel, int level, string_view text) override;
@@ -133,16 +150,14 @@ public:
 
     bool levelPrefix = true; ///< "[erro] " and the like before the text
 
-protected:
-    std::FILE* file() const noexcept { return file_; }
-
 private:
-    std::FILE* file_;
+    std::FILE* file_; ///< null if it could not be opened
     bool ownsFile_;
     bool terminal_;
 };
 
-/// A table in `name` + ".html"; an older file is kept as `name` + "-old.html".
+/// A table in `name` + ".html"; an older file is kept as `name` + "-old.html". What can't be
+/// opened is dealt with as in `StdLog`. Once finished, it drops further messages.
 class BASE1_API HtmlLog : public ICustomLog {
 public:
     explicit HtmlLog(const string& name);
@@ -150,13 +165,14 @@ public:
     void message(name_id channel, int level, string_view text) override;
     void progress(u32 percent, string_view text) override;
     void progressEnd() override;
+    void finish() override;
 
 private:
-    std::FILE* file_;
+    std::FILE* file_; ///< null if it could not be opened, and once finished
 };
 
-/// The process-wide log. Outputs that are attached at the end of the process are removed then,
-/// so that they can finish their files.
+/// The process-wide log. Outputs that are still attached at the end of the process are removed
+/// then, so that they can finish their files.
 BASE1_API Log& log();
 
 /// A `StdLog` on the standard error stream, made at first use and attached to nothing.

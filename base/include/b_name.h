@@ -17,7 +17,8 @@ struct NameRecord {
     const char* chars; ///< zero-terminated UTF-8
     u32 length;        ///< bytes, without the zero
     u32 hash;          ///< FNV-1a of the bytes
-    void* extra;       ///< null at creation; for the code that numbers names while writing
+    /// Null at creation; for the code that numbers names while writing.
+    mutable void* extra;
 };
 
 /// Handle of an interned name, the size of a pointer; null is the absent name.

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "b_config.h"
+#include "b_lock.h"
 #include "b_memory.h"
 #include "b_types.h"
 
@@ -42,28 +43,21 @@ private:
     mutable u32 count_ = 0;
 };
 
-/// Lock word for short critical sections.
-class BASE1_API SpinLock : public NonCopyable {
-public:
-    void lock() noexcept;
-    void unlock() noexcept { word_.store(0, std::memory_order_release); }
-
-private:
-    std::atomic<u32> word_{0};
-};
-
 class WeakRefBase;
 
 /// Atomic count with weak pointers. When the count falls to 0, every weak pointer is set to null
 /// under the lock and then the object is destroyed. `ref`s may be copied and dropped on any
-/// thread.
+/// thread; a weak pointer may not be used while another thread drops the last `ref`.
 class BASE1_API RefCntAtomic {
 public:
     RefCntAtomic(const RefCntAtomic&) = delete;
     RefCntAtomic& operator=(const RefCntAtomic&) = delete;
 
     void addRef() const noexcept { count_.fetch_add(1, std::memory_order_relaxed); }
-    void release() const;
+    void release() const {
+        if (count_.fetch_sub(1, std::memory_order_acq_rel) == 1)
+            die();
+    }
     i32 refCount() const noexcept { return count_.load(std::memory_order_relaxed); }
 
 protected:
@@ -74,6 +68,9 @@ protected:
 
 private:
     friend class WeakRefBase;
+    void die() const;
+    void clearWeakRefs() const;
+
     mutable std::atomic<i32> count_{0};
     mutable SpinLock weakLock_;
     mutable WeakRefBase* weakHead_ = nullptr;
@@ -84,7 +81,7 @@ class BASE1_API WeakRefBase : public NonCopyable {
 protected:
     WeakRefBase() = default;
     ~WeakRefBase() { set(nullptr); }
-    void set(const RefCntAtomic* target);
+    void set(const RefCntAtomic* target) noexcept;
     const RefCntAtomic* target() const noexcept { return target_; }
 
 private:
@@ -109,11 +106,10 @@ public:
     ref(const ref& other) : ref(other.object_) {}
     ref(ref&& other) noexcept : object_(std::exchange(other.object_, nullptr)) {}
     template <class U>
-        requires std::is_convertible_v<U*, T*>
-    ref(const ref<U>& other) : ref(other.get()) {}
+    requires std::is_convertible_v<U*, T*> ref(const ref<U>& other) : ref(other.get()) {}
     template <class U>
-        requires std::is_convertible_v<U*, T*>
-    ref(ref<U>&& other) noexcept : object_(other.detach()) {}
+    requires std::is_convertible_v<U*, T*> ref(ref<U>&& other)
+    noexcept : object_(other.detach()) {}
     ref& operator=(ref other) noexcept {
         std::swap(object_, other.object_);
         return *this;
@@ -155,19 +151,17 @@ template <class T>
 class weak_ref : public WeakRefBase {
 public:
     weak_ref() = default;
-    explicit weak_ref(T* target) { set(target); }
-    weak_ref(const weak_ref& other) : weak_ref(other.get()) {}
-    weak_ref& operator=(const weak_ref& other) {
+    explicit weak_ref(T* target) noexcept { set(target); }
+    weak_ref(const weak_ref& other) noexcept : weak_ref(other.get()) {}
+    weak_ref& operator=(const weak_ref& other) noexcept {
         set(other.target());
         return *this;
     }
-    weak_ref& operator=(T* target) {
+    weak_ref& operator=(T* target) noexcept {
         set(target);
         return *this;
     }
-    T* get() const noexcept {
-        return const_cast<T*>(static_cast<const T*>(target()));
-    }
+    T* get() const noexcept { return const_cast<T*>(static_cast<const T*>(target())); }
     explicit operator bool() const noexcept { return target() != nullptr; }
 };
 

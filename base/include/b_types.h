@@ -137,6 +137,9 @@ struct rational {
     auto operator<=>(const rational&) const = default;
 };
 
+/// Marks objects whose lengths have a unit; holds nothing.
+struct Distance {};
+
 using vec2f = base_vec2<float>;
 using vec3f = base_vec3<float>;
 using vec4f = base_vec4<float>;

@@ -31,26 +31,33 @@ enum class StreamOrigin : u32 { start = 0, current = 1, end = 2 };
 
 /// The operations of a worker. Entries that a worker leaves unset throw `unsupported_interface`.
 struct StreamOperations {
-    /// Address of the whole content, for workers that lie in memory.
+    /// Address of the whole content, for workers that lie in memory; good until the size changes.
     void* (*map)(StreamWorker&, u64& start, u64& size);
+    /// Returns the bytes read, fewer at the end.
     u64 (*read)(StreamWorker&, void* destination, u64 byteCount);
+    /// Returns the bytes written, fewer where there is no room.
     u64 (*write)(StreamWorker&, const void* source, u64 byteCount);
-    /// Returns the new position.
+    /// Clamps to the content and returns the new position.
     u64 (*setPosition)(StreamWorker&, i64 offset, StreamOrigin origin);
     u64 (*getPosition)(StreamWorker&);
     u64 (*getSize)(StreamWorker&);
+    /// A position past the new end moves there.
     void (*setSize)(StreamWorker&, u64 size);
+    /// True when the position is at or past the size.
     bool (*atEnd)(StreamWorker&);
     void (*flush)(StreamWorker&);
+    /// Ends the worker's use of its data. Called once, by the last handle.
     void (*close)(StreamWorker&);
     void (*reserved)(StreamWorker&);
+    /// A new stream on the same data, at position 0.
     Stream (*clone)(StreamWorker&);
 };
 
-/// Transforms the bytes of a stream; copied with a clone of it.
+/// Transforms the bytes of a stream; a clone of the stream gets a clone of it.
 class BASE1_API StreamCoder {
 public:
     virtual ~StreamCoder();
+    /// The caller owns the result.
     virtual StreamCoder* clone() const = 0;
 };
 
@@ -107,7 +114,7 @@ public:
     void setSize(u64 size) { worker_->operations.setSize(*worker_, size); }
     bool atEnd() const { return worker_->operations.atEnd(*worker_); }
     void flush() { worker_->operations.flush(*worker_); }
-    /// A handle on the same data with a position of its own.
+    /// A stream on the same data with a worker and a position of its own, at 0.
     Stream clone() const;
     /// Drops this handle. The last one closes the worker; what goes wrong then is logged.
     void close() noexcept;
@@ -116,7 +123,8 @@ public:
     void setFlags(u32 flags) noexcept { flags_ = flags; }
 
     /// Copies from the present position of the source to its end. The source must be readable
-    /// and the target writable, else `unsupported_interface`; a short transfer throws.
+    /// and the target writable, else `unsupported_interface`; a short transfer throws whatever
+    /// the flags. Both return this stream.
     Stream& operator>>(Stream& target);
     Stream& operator<<(Stream& source);
 
