@@ -1,0 +1,361 @@
+#include "gltf_faults.h"
+#include "gltf_reader.h"
+#include "gltf_statistics.h"
+
+#include <draco/compression/encode.h>
+#include <draco/mesh/mesh.h>
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <fstream>
+#include <functional>
+
+namespace test_support {
+namespace {
+
+void append(Bytes& bytes, const void* data, size_t size) {
+    const auto* first = static_cast<const uint8_t*>(data);
+    bytes.insert(bytes.end(), first, first + size);
+}
+
+/// A container with the parts as given, right or wrong.
+Bytes makeGlb(const std::string& json, const Bytes& binary, uint32_t version = 2,
+              uint32_t binaryType = 0x004E4942) {
+    const uint32_t lengths[] = {static_cast<uint32_t>(json.size()),
+                                static_cast<uint32_t>(binary.size())};
+    const uint32_t header[] = {0x46546C67, version, 28 + lengths[0] + lengths[1], lengths[0],
+                               0x4E4F534A};
+    Bytes bytes;
+    append(bytes, header, sizeof(header));
+    append(bytes, json.data(), json.size());
+    append(bytes, &lengths[1], 4);
+    append(bytes, &binaryType, 4);
+    append(bytes, binary.data(), binary.size());
+    return bytes;
+}
+
+std::string errorOf(const std::function<void()>& action) {
+    try {
+        action();
+    } catch (const GltfError& error) {
+        return error.what();
+    }
+    return "no error";
+}
+
+/// Two right triangles in a quad of 3 x 4, two nodes that draw it: one at twice the size and
+/// turned by 90 degrees about Z, its child mirrored in X and moved by (1, 0, 5).
+/// Bytes: 4 positions of 12 at a stride of 16 (the gap holds a colour), 6 short indices.
+const std::string quadJson = R"({"asset":{"version":"2.0"},"scene":0,"scenes":[{"nodes":[1]}],
+"nodes":[{"mesh":0,"matrix":[-1,0,0,0, 0,1,0,0, 0,0,1,0, 1,0,5,1]},
+{"mesh":0,"children":[0],"scale":[2,2,2],"rotation":[0,0,0.7071067811865476,0.7071067811865476]}],
+"meshes":[{"primitives":[{"attributes":{"POSITION":0,"COLOR_0":1},"indices":2}]}],
+"accessors":[
+{"bufferView":0,"componentType":5126,"count":4,"type":"VEC3","min":[0,0,0],"max":[3,4,0]},
+{"bufferView":0,"byteOffset":12,"componentType":5121,"normalized":true,"count":4,"type":"VEC4"},
+{"bufferView":1,"componentType":5123,"count":6,"type":"SCALAR"}],
+"bufferViews":[{"buffer":0,"byteLength":64,"byteStride":16},
+{"buffer":0,"byteOffset":64,"byteLength":12}],
+"buffers":[{"byteLength":76}]})";
+
+Bytes quadBytes() {
+    const float corners[4][3] = {{0, 0, 0}, {3, 0, 0}, {3, 4, 0}, {0, 4, 0}};
+    const uint8_t colour[4] = {0, 51, 102, 255};
+    const uint16_t indices[6] = {0, 1, 2, 0, 2, 3};
+    Bytes bytes;
+    for (const auto& corner : corners) {
+        append(bytes, corner, sizeof(corner));
+        append(bytes, colour, sizeof(colour));
+    }
+    append(bytes, indices, sizeof(indices));
+    return bytes;
+}
+
+Bytes padded(Bytes bytes) {
+    bytes.resize((bytes.size() + 3) / 4 * 4);
+    return bytes;
+}
+
+std::string padded(std::string json) {
+    return json.append((4 - json.size() % 4) % 4, ' ');
+}
+
+TEST(GltfReader, ReadsContainer) {
+    const GltfFile file = GltfFile::fromBinary(makeGlb(padded(quadJson), quadBytes()));
+    EXPECT_TRUE(findFaults(file).empty());
+    const AccessorValues colours = file.accessor(1);
+    ASSERT_EQ(colours.values.size(), 16U);
+    EXPECT_DOUBLE_EQ(colours.at(3)[1], 0.2);
+    EXPECT_DOUBLE_EQ(colours.at(3)[3], 1.0);
+
+    const Statistics statistics = statisticsOf(file);
+    EXPECT_EQ(statistics.nodes, 2U);
+    EXPECT_EQ(statistics.vertices, 4U);
+    EXPECT_EQ(statistics.stored.triangles, 2U);
+    EXPECT_DOUBLE_EQ(statistics.stored.area, 12);
+    EXPECT_EQ(statistics.drawn.triangles, 4U);
+    EXPECT_NEAR(statistics.drawn.area, 2 * 12 * 4, 1e-9);
+    // The turn takes (x, y) to (-2y, 2x); the child spans x -2..1, y 0..4 at z = 5 before it.
+    // Seen from the origin the mirrored child is the base of a cone of height 10, wound clockwise.
+    const Vector min{-8, -4, 0}, max{0, 6, 10};
+    for (size_t axis = 0; axis < 3; ++axis) {
+        EXPECT_NEAR(statistics.drawn.bounds.min[axis], min[axis], 1e-9);
+        EXPECT_NEAR(statistics.drawn.bounds.max[axis], max[axis], 1e-9);
+    }
+    EXPECT_NEAR(statistics.drawn.volume, -48.0 * 10 / 3, 1e-9);
+}
+
+TEST(GltfReader, RejectsBrokenContainers) {
+    const Bytes good = makeGlb(padded(quadJson), quadBytes());
+    const auto load = [](const Bytes& bytes) {
+        return errorOf([&] { GltfFile::fromBinary(Bytes(bytes)); });
+    };
+    ASSERT_EQ(load(good), "no error");
+    for (size_t size = 0; size < good.size(); ++size) {
+        EXPECT_NE(load({good.begin(), good.begin() + static_cast<ptrdiff_t>(size)}), "no error")
+            << size;
+    }
+    Bytes longer = good;
+    longer.push_back(0);
+    EXPECT_NE(load(longer), "no error");
+    Bytes otherMagic = good;
+    otherMagic[0] = 'G';
+    EXPECT_EQ(load(otherMagic), "glb: wrong magic");
+
+    Bytes tooLong = quadBytes();
+    tooLong.insert(tooLong.end(), 4, 0);
+    Bytes badPadding = quadBytes();
+    badPadding.back() = 1;
+    struct Row {
+        const char* text;
+        Bytes bytes;
+    };
+    std::string shorter = quadJson;
+    shorter.replace(shorter.rfind("76"), 2, "73");
+    const Row rows[] = {
+        {"glb: version 1", makeGlb(padded(quadJson), quadBytes(), 1)},
+        {"glb: wrong type of the BIN chunk", makeGlb(padded(quadJson), quadBytes(), 2, 1)},
+        {"glb: the length of the JSON chunk is no multiple of 4",
+         makeGlb(padded(quadJson) + " ", quadBytes())},
+        {"glb: more than three blanks behind the JSON text",
+         makeGlb(padded(quadJson) + "    ", quadBytes())},
+        {"glb: the JSON chunk is padded with something else than blanks",
+         makeGlb(padded(quadJson + "\n"), quadBytes())},
+        {"/buffers/0: wrong number of bytes behind the content",
+         makeGlb(padded(quadJson), tooLong)},
+        {"/buffers/0: padding that is not zero", makeGlb(padded(shorter), badPadding)},
+    };
+    for (const Row& row : rows) {
+        EXPECT_EQ(load(row.bytes), row.text);
+    }
+}
+
+TEST(GltfReader, ReadsTextWithDataUri) {
+    // The base64 text holds the bytes 1, 2, 3, 0, 4, 5, 6, 0, 0x80, 0xFF.
+    const std::string json = R"({"buffers":[{"byteLength":10,
+"uri":"data:application/octet-stream;base64,AQIDAAQFBgCA/w=="}],
+"bufferViews":[{"buffer":0,"byteLength":8},{"buffer":0,"byteOffset":8,"byteLength":2}],
+"accessors":[{"bufferView":0,"componentType":5121,"count":1,"type":"MAT2"},
+{"bufferView":1,"componentType":5120,"normalized":true,"count":2,"type":"SCALAR"},
+{"bufferView":1,"componentType":5122,"count":1,"type":"SCALAR"},
+{"bufferView":0,"byteOffset":2,"componentType":5123,"count":2,"type":"SCALAR"},
+{"bufferView":0,"componentType":5125,"count":2,"type":"SCALAR"},
+{"bufferView":0,"byteOffset":1,"componentType":5123,"count":4,"type":"SCALAR"}]})";
+    const GltfFile file = GltfFile::fromText(json);
+    // Columns of a matrix of bytes start at multiples of four.
+    EXPECT_EQ(file.accessor(0).values, (std::vector<double>{1, 2, 4, 5}));
+    EXPECT_EQ(file.accessor(1).values, (std::vector<double>{-1, -1.0 / 127}));
+    EXPECT_EQ(file.accessor(2).values, (std::vector<double>{-128}));
+    EXPECT_EQ(file.accessor(3).values, (std::vector<double>{3, 0x0504}));
+    EXPECT_EQ(file.accessor(4).values, (std::vector<double>{0x00030201, 0x00060504}));
+    EXPECT_EQ(errorOf([&] { file.accessor(5); }), "/accessors/5: ends at byte 9 of a view of 8");
+    std::string broken = json;
+    broken.replace(broken.find("AQID"), 4, "AQ*D");
+    EXPECT_NE(errorOf([&] { GltfFile::fromText(broken); }), "no error");
+    EXPECT_NE(errorOf([&] { GltfFile::fromText(json.substr(0, 50)); }), "no error");
+}
+
+TEST(GltfReader, RejectsBrokenReferences) {
+    const std::pair<const char*, const char*> edits[] = {
+        {R"("indices":2)", R"("indices":3)"},
+        {R"("indices":2)", R"("indices":0)"},
+        {R"("byteLength":12)", R"("byteLength":13)"},
+        {R"("byteStride":16)", R"("byteStride":8)"},
+        {R"("count":6)", R"("count":7)"},
+        {R"("count":4,"type":"VEC4")", R"("count":3,"type":"VEC4")"},
+        {R"("children":[0])", R"("children":[1])"},
+        {R"("children":[0])", R"("children":[2])"},
+    };
+    for (const auto& [from, to] : edits) {
+        std::string json = quadJson;
+        json.replace(json.find(from), std::strlen(from), to);
+        const Bytes bytes = makeGlb(padded(json), quadBytes());
+        const auto read = [&] { statisticsOf(GltfFile::fromBinary(bytes)); };
+        EXPECT_NE(errorOf(read), "no error") << to;
+    }
+}
+
+TEST(GltfReader, FindsSideFilesByDecodedName) {
+    const std::filesystem::path folder =
+        std::filesystem::path(testing::TempDir()) / "gltf_reader side files";
+    std::filesystem::create_directories(folder);
+    for (const char* name : {"a b.bin", "a%2b.bin"}) {
+        std::ofstream(folder / name) << name[1];
+    }
+    const auto load = [&](const std::string& uri) {
+        const GltfFile file =
+            GltfFile::fromText(R"({"buffers":[{"byteLength":1,"uri":")" + uri +
+                                   R"("}],"bufferViews":[{"buffer":0,"byteLength":1}]})",
+                               folder);
+        return static_cast<char>(file.bufferView(0)[0]);
+    };
+    EXPECT_EQ(load("a%20b.bin"), ' ');
+    EXPECT_EQ(load("a b.bin"), ' ');
+    EXPECT_EQ(load("a%2b.bin"), '%');
+    EXPECT_NE(errorOf([&] { load("none.bin"); }), "no error");
+    EXPECT_NE(errorOf([&] { load("."); }), "no error");
+    std::filesystem::remove_all(folder);
+}
+
+TEST(GltfReader, CountsByMode) {
+    // Five corners of a flat arc, so that strips and fans have triangles of both parities.
+    Primitive primitive;
+    primitive.indices = {0, 1, 2, 3, 4};
+    using Triangles = std::vector<std::array<uint32_t, 3>>;
+    const std::pair<int, Triangles> rows[] = {
+        {-1, {}},
+        {0, {}},
+        {1, {}},
+        {4, {{0, 1, 2}}},
+        {5, {{0, 1, 2}, {1, 3, 2}, {2, 3, 4}}},
+        {6, {{0, 1, 2}, {0, 2, 3}, {0, 3, 4}}},
+    };
+    for (const auto& [mode, triangles] : rows) {
+        primitive.mode = mode;
+        EXPECT_EQ(primitive.triangles(), triangles) << mode;
+    }
+    // points, lines, loop, strip
+    const std::pair<size_t, size_t> counts[] = {{6, 0}, {0, 3}, {0, 6}, {0, 5}};
+    for (size_t mode = 0; mode < std::size(counts); ++mode) {
+        std::string json = quadJson;
+        json.replace(json.find(R"("indices":2)"), 11,
+                     R"("indices":2,"mode":)" + std::to_string(mode));
+        const Totals drawn =
+            statisticsOf(GltfFile::fromBinary(makeGlb(padded(json), quadBytes()))).stored;
+        EXPECT_EQ(drawn.points, counts[mode].first) << mode;
+        EXPECT_EQ(drawn.lines, counts[mode].second) << mode;
+        EXPECT_TRUE(drawn.triangleBounds.isEmpty());
+        EXPECT_EQ(drawn.bounds.max, (Vector{3, 4, 0}));
+    }
+}
+
+TEST(GltfReader, ReportsWhatDeclarationsGetWrong) {
+    const auto faultsWith = [](const char* from, const char* to, Bytes bytes = quadBytes()) {
+        std::string json = quadJson;
+        json.replace(json.find(from), std::strlen(from), to);
+        std::string kinds;
+        for (const Fault& fault : findFaults(GltfFile::fromBinary(makeGlb(padded(json), bytes)))) {
+            kinds += fault.kind + " " + fault.text.substr(0, fault.text.find(':')) + ";";
+        }
+        return kinds;
+    };
+    EXPECT_EQ(faultsWith("[3,4,0]", "[3,4.5,0]"), "limits /accessors/0;");
+    Bytes shifted = quadBytes();
+    shifted.insert(shifted.begin() + 64, 0);
+    EXPECT_EQ(faultsWith("\"byteOffset\":64,\"byteLength\":12}],\n\"buffers\":[{\"byteLength\":76",
+                         "\"byteOffset\":65,\"byteLength\":12}],\n\"buffers\":[{\"byteLength\":77",
+                         padded(shifted)),
+              "alignment /accessors/2;");
+    Bytes infinite = quadBytes();
+    infinite[2] = 0x80;
+    infinite[3] = 0x7F;
+    EXPECT_EQ(faultsWith("2.0", "2.0", infinite), "not-finite /accessors/0;");
+    EXPECT_EQ(faultsWith(R"("asset")", R"("images":[{"uri":"data:image/png;base64,"}],"asset")"),
+              "image /images/0;");
+}
+
+/// A tetrahedron with one face more that has two equal corners, which the encoder drops. The
+/// position is the second attribute, behind one that holds the number of the vertex.
+Bytes encodeTetrahedron() {
+    const float positions[4][3] = {{0, 0, 0}, {10, 0, 0}, {0, 10, 0}, {0, 0, 10}};
+    const uint16_t numbers[4] = {7, 8, 9, 10};
+    const uint32_t faces[5][3] = {{0, 2, 1}, {0, 1, 3}, {0, 3, 2}, {1, 2, 3}, {1, 1, 3}};
+    draco::Mesh mesh;
+    mesh.SetNumFaces(5);
+    mesh.set_num_points(4);
+    for (uint32_t f = 0; f < 5; ++f) {
+        mesh.SetFace(draco::FaceIndex(f),
+                     {draco::PointIndex(faces[f][0]), draco::PointIndex(faces[f][1]),
+                      draco::PointIndex(faces[f][2])});
+    }
+    const auto add = [&](draco::GeometryAttribute::Type type, int8_t components,
+                         draco::DataType dataType, int64_t size, const void* data) {
+        draco::GeometryAttribute attribute;
+        attribute.Init(type, nullptr, components, dataType, false, size, 0);
+        draco::PointAttribute* added = mesh.attribute(mesh.AddAttribute(attribute, true, 4));
+        added->buffer()->Write(0, data, static_cast<size_t>(size) * 4);
+    };
+    add(draco::GeometryAttribute::GENERIC, 1, draco::DT_UINT16, 2, numbers);
+    add(draco::GeometryAttribute::POSITION, 3, draco::DT_FLOAT32, 12, positions);
+    draco::Encoder encoder;
+    encoder.SetAttributeQuantization(draco::GeometryAttribute::POSITION, 14);
+    draco::EncoderBuffer buffer;
+    EXPECT_TRUE(encoder.EncodeMeshToBuffer(mesh, &buffer).ok());
+    Bytes bytes;
+    append(bytes, buffer.data(), buffer.size());
+    return padded(bytes);
+}
+
+TEST(GltfReader, DecodesDraco) {
+    const Bytes stream = encodeTetrahedron();
+    const std::string length = std::to_string(stream.size());
+    const std::string json = R"({"scenes":[{"nodes":[0]}],"nodes":[{"mesh":0,"scale":[1,1,-3]}],
+"meshes":[{"primitives":[{"attributes":{"POSITION":0,"_NUMBER":1},"indices":2,"extensions":{
+"KHR_draco_mesh_compression":{"bufferView":0,"attributes":{"POSITION":1,"_NUMBER":0}}}}]}],
+"accessors":[
+{"componentType":5126,"count":4,"type":"VEC3","min":[0,0,0],"max":[10,10,10]},
+{"componentType":5123,"count":4,"type":"SCALAR"},{"componentType":5125,"count":15,"type":"SCALAR"}],
+"bufferViews":[{"buffer":0,"byteLength":)" +
+                             length + R"(}],"buffers":[{"byteLength":)" + length + "}]}";
+    const GltfFile file = GltfFile::fromBinary(makeGlb(padded(json), stream));
+    const Primitive primitive = file.primitive(0, 0);
+    ASSERT_TRUE(primitive.compressed);
+    ASSERT_EQ(primitive.indices.size(), 12U);
+    const AccessorValues& positions = primitive.attributes.at("POSITION");
+    const AccessorValues& numbers = primitive.attributes.at("_NUMBER");
+    for (size_t i = 0; i < positions.count; ++i) {
+        // Vertex 7 is the origin, 8 to 10 lie on the axes.
+        for (size_t axis = 0; axis < 3; ++axis) {
+            EXPECT_NEAR(positions.at(i)[axis],
+                        numbers.at(i)[0] == static_cast<double>(8 + axis) ? 10 : 0, 1e-5);
+        }
+    }
+
+    // Three right triangles and one that is equilateral, then stretched along Z and mirrored.
+    const Statistics statistics = statisticsOf(file);
+    EXPECT_NEAR(statistics.stored.area, 3 * 50 + std::sqrt(3) / 4 * 200, 1e-4);
+    EXPECT_NEAR(statistics.stored.volume, 1000.0 / 6, 1e-3);
+    EXPECT_NEAR(statistics.drawn.volume, -3 * 1000.0 / 6, 1e-2);
+    EXPECT_NEAR(statistics.drawn.bounds.min[2], -30, 1e-4);
+    EXPECT_NEAR(statistics.positionError[0], 10.0 / 16383 / 2, 1e-9);
+    EXPECT_NEAR(statistics.positionError[2], 30.0 / 16383 / 2, 1e-9);
+
+    const std::vector<Fault> faults = findFaults(file);
+    ASSERT_EQ(faults.size(), 1U);
+    EXPECT_EQ(faults[0].kind, "draco-count");
+    EXPECT_EQ(faults[0].text, "/accessors/2: declared 15 elements, the stream has 12");
+    for (size_t cut = 4; cut < stream.size(); cut += 4) {
+        Bytes shorter(stream.begin(), stream.end() - static_cast<ptrdiff_t>(cut));
+        std::string text = json;
+        for (size_t at = text.find(length); at != std::string::npos; at = text.find(length)) {
+            text.replace(at, length.size(), std::to_string(shorter.size()) + " ");
+        }
+        EXPECT_NE(
+            errorOf([&] { GltfFile::fromBinary(makeGlb(padded(text), shorter)).primitive(0, 0); }),
+            "no error")
+            << cut;
+    }
+}
+
+} // namespace
+} // namespace test_support

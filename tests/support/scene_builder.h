@@ -1,0 +1,114 @@
+#pragma once
+
+#include "scene.h"
+#include "scene_factory.h"
+#include "scene_schema.h"
+
+#include <stdexcept>
+
+namespace test_support {
+
+/// A document with a scene and its root node, to which tests add objects.
+class SceneBuilder {
+public:
+    SceneBuilder() {
+        scene::register_scene_schema(*factory);
+        scene = &add<scene::IScene>();
+        root = &add<scene::INode>();
+        write(*scene, scene::scene_schema::n_root) = scene::Object(root);
+    }
+
+    /// A new object that nothing refers to yet. The factory owns it.
+    template <class T>
+    T& add(const char* name = "") {
+        T* object = dynamic_cast<T*>(factory->create(T::Schema::n_kind).get());
+        if (!object)
+            throw std::logic_error("the factory made another class");
+        if (*name)
+            write(*object, nameAttribute) = name;
+        return *object;
+    }
+    /// A new object among the children of `parent`.
+    template <class T>
+    T& addTo(scene::INode& parent, const char* name = "") {
+        T& object = add<T>(name);
+        append(parent, object);
+        return object;
+    }
+    static void append(scene::INode& parent, base::IPlugin& child) {
+        write(parent, scene::node_schema::n_children).push_back(scene::Object(&child));
+    }
+
+    base::ref<scene::SceneFactory> factory = base::makeRef<scene::SceneFactory>();
+    scene::IScene* scene;
+    scene::INode* root;
+
+private:
+    static constexpr auto& nameAttribute = scene::node_schema::n_name;
+};
+
+/// Appends a map to one of the lists of a mesh or morph.
+inline base::AttribMap& appendItem(base::AttribMap& object,
+                                   const scene::SchemaAttribute<scene::Items>& list) {
+    auto* item = new base::AttribMap;
+    write(object, list).append(item);
+    return *item;
+}
+
+/// Appends a primitive of faces with `corners` corners each.
+inline base::AttribMap& appendPrimitive(scene::IMesh& mesh, base::u16 corners) {
+    using scene::meshPrimitive_schema;
+    base::AttribMap& primitive = appendItem(mesh, scene::mesh_schema::n_primitives);
+    write(primitive, meshPrimitive_schema::n_vcounts) = {corners};
+    return primitive;
+}
+/// The same for `count` entries of the index array from `start` on.
+inline base::AttribMap& appendPrimitive(scene::IMesh& mesh, base::u16 corners, base::u32 start,
+                                        base::u32 count) {
+    using scene::meshPrimitive_schema;
+    base::AttribMap& primitive = appendPrimitive(mesh, corners);
+    write(primitive, meshPrimitive_schema::n_indexStart) = start;
+    write(primitive, meshPrimitive_schema::n_indexCount) = count;
+    return primitive;
+}
+
+inline base::vector<base::vec2f>& appendUVs(scene::IMesh& mesh) {
+    return write(appendItem(mesh, scene::mesh_schema::n_uvSets), scene::meshUVSet_schema::n_UV);
+}
+inline base::vector<base::vec3f>& appendColors(scene::IMesh& mesh) {
+    return write(appendItem(mesh, scene::mesh_schema::n_colorSets),
+                 scene::meshColorSet_schema::n_RGB);
+}
+
+/// Makes `mesh` the triangle (0, 0, 0), (1, 0, 0), (0, 1, 0), without indices.
+inline scene::IMesh& makeTriangle(scene::IMesh& mesh) {
+    write(mesh, scene::mesh_schema::n_positions) = {{0, 0, 0}, {1, 0, 0}, {0, 1, 0}};
+    appendPrimitive(mesh, 3);
+    return mesh;
+}
+
+/// Makes `mesh` a grid of `size` by `size` unit squares in the XY plane, each of two triangles,
+/// with normals and texture coordinates.
+inline scene::IMesh& makeGrid(scene::IMesh& mesh, base::u32 size) {
+    auto& uvs = appendUVs(mesh);
+    auto& positions = write(mesh, scene::mesh_schema::n_positions);
+    auto& normals = write(mesh, scene::mesh_schema::n_normals);
+    auto& indices = write(mesh, scene::mesh_schema::n_indices);
+    for (base::u32 y = 0; y <= size; ++y) {
+        for (base::u32 x = 0; x <= size; ++x) {
+            const auto fx = static_cast<float>(x), fy = static_cast<float>(y);
+            positions.push_back({fx, fy, 0});
+            normals.push_back({0, 0, 1});
+            uvs.push_back({fx / static_cast<float>(size), fy / static_cast<float>(size)});
+            if (x < size && y < size) {
+                const base::u32 a = y * (size + 1) + x, b = a + size + 1;
+                for (const base::u32 index : {a, a + 1, b + 1, a, b + 1, b})
+                    indices.push_back(index);
+            }
+        }
+    }
+    appendPrimitive(mesh, 3);
+    return mesh;
+}
+
+} // namespace test_support
