@@ -25,13 +25,21 @@ struct SchemaName {
     operator base::name_id() const noexcept { return id; }
 };
 
-/// Marks an attribute that is an array of maps.
+/// Marks an attribute that is an array, of maps where nothing else is said.
 struct Items {};
 /// Marks an attribute that is a map.
 struct Submap {};
+/// Marks an attribute whose type depends on the object that carries it.
+struct Untyped {};
+
+/// Value types of the tables: a code number, a reference to an object, vectors.
+using Enumeration = base::u8;
+using Object = base::ref<base::IPlugin>;
+template <class T>
+using Array = base::vector<T>;
 
 /// An attribute without a default: absent means none, null or empty. T is the value type of a
-/// scalar, `base::vector` of it for a vector, `Items` or `Submap`.
+/// scalar, `Array` of it for a vector, or one of the marks.
 template <class T>
 struct SchemaAttribute : SchemaName {};
 
@@ -45,9 +53,9 @@ template <class T>
 constexpr SchemaAttribute<T> schemaAttribute(const char* text) {
     return {{text}};
 }
-template <class T, class D>
-constexpr DefaultedAttribute<T> schemaAttribute(const char* text, D&& defaultValue) {
-    return {{text}, T(defaultValue)};
+template <class T>
+constexpr DefaultedAttribute<T> schemaAttribute(const char* text, T defaultValue) {
+    return {{text}, defaultValue};
 }
 
 /// The attribute's value, or its default where `map` has none. A wrong type is logged.
@@ -79,6 +87,25 @@ inline base::AttribMap* find(const base::AttribMap& map, const SchemaAttribute<S
     return map.findMap(attribute);
 }
 
+/// Calls `use` with the vector of an attribute whose elements may be of several types. False where
+/// there is none; a type that is not among them is logged and counts as none.
+template <class First, class... Others, class Use>
+bool visitVector(const base::AttribMap& map, base::name_id name, const Use& use) {
+    const base::Attribute* attribute = map.findAttribute(name);
+    if (!attribute)
+        return false;
+    const auto visit = [&]<class T>(std::type_identity<T>) {
+        if (attribute->type() != base::TypeTraits<T>::n_array_name)
+            return false;
+        use(*static_cast<const base::vector<T>*>(attribute->data()));
+        return true;
+    };
+    if (visit(std::type_identity<First>()) || (visit(std::type_identity<Others>()) || ...))
+        return true;
+    map.findVecAttribute<First>(name);
+    return false;
+}
+
 /// The attribute's value for writing, made with its type's zero where `map` has none.
 template <class T>
 T& write(base::AttribMap& map, const SchemaAttribute<T>& attribute) {
@@ -98,9 +125,49 @@ inline base::AttribArray& write(base::AttribMap& map, const SchemaAttribute<Item
 
 /// The object that a reference attribute holds, null where there is none.
 inline base::IPlugin* findObject(const base::AttribMap& map,
-                                 const SchemaAttribute<base::ref<base::IPlugin>>& attribute) {
-    const base::ref<base::IPlugin>* object = map.findAttribute<base::ref<base::IPlugin>>(attribute);
+                                 const SchemaAttribute<Object>& attribute) {
+    const Object* object = map.findAttribute<Object>(attribute);
     return object ? object->get() : nullptr;
+}
+
+/// Values in double precision.
+inline double widened(double value) {
+    return value;
+}
+template <class T>
+base::vec3d widened(const base::base_vec3<T>& v) {
+    return {v.x, v.y, v.z};
+}
+template <class T>
+base::vec4d widened(const base::base_vec4<T>& v) {
+    return {v.x, v.y, v.z, v.w};
+}
+template <class T>
+base::quatd widened(const base::base_quat<T>& q) {
+    return {q.x, q.y, q.z, q.w};
+}
+
+/// Sets `components` to those of the attribute `name` if it is a float or double value with as
+/// many (four: a vector or a quaternion). False if it has another type, which is not logged.
+bool loadReal(const base::AttribMap& map, base::name_id name, std::span<double> components);
+
+template <class Attribute, class T>
+auto readRealOr(const base::AttribMap& map, const Attribute& attribute, const T& absent) {
+    auto value = widened(absent);
+    const std::span components(reinterpret_cast<double*>(&value), sizeof value / sizeof(double));
+    if (!loadReal(map, attribute, components))
+        static_cast<void>(find(map, attribute)); // logs the wrong type
+    return value;
+}
+/// As `read`, in double precision and from a value stored in either: what an animation channel
+/// yields has the precision of its keys. Without a default an absent attribute counts as zero.
+template <class T>
+auto readReal(const base::AttribMap& map, const DefaultedAttribute<T>& attribute) {
+    return readRealOr(map, attribute, attribute.defaultValue);
+}
+template <class T>
+auto readReal(const base::AttribMap& map, const SchemaAttribute<T>& attribute) {
+    return readRealOr(map, attribute, T{});
 }
 
 /// Declares one attribute of a schema: name, type, and the default if there is one.
@@ -109,17 +176,21 @@ inline base::IPlugin* findObject(const base::AttribMap& map,
         ::scene::schemaAttribute<type>(#name __VA_OPT__(, ) __VA_ARGS__);
 #define SCENE_ATTRIBUTE_ADDRESS(name, ...) &n_##name,
 
-/// Declares the schema struct of a type from its table: a macro that applies its argument to
-/// each row.
+/// Declares the schema struct of a type from its table, a macro that applies its argument to
+/// each row: the type's own name as `n_kind`, then the attributes.
 #define SCENE_SCHEMA(type, TABLE)                                                           \
     struct type##_schema {                                                                  \
-        static inline constinit ::scene::SchemaName n_type{#type};                          \
+        static inline constinit ::scene::SchemaName n_kind{#type};                          \
         TABLE(SCENE_ATTRIBUTE)                                                              \
+        /* All names, the type's first. */                                                  \
         static std::span<::scene::SchemaName* const> names() {                              \
-            static constexpr ::scene::SchemaName* all[] = {&n_type,                         \
+            static constexpr ::scene::SchemaName* all[] = {&n_kind,                         \
                                                            TABLE(SCENE_ATTRIBUTE_ADDRESS)}; \
             return all;                                                                     \
         }                                                                                   \
     };
+
+/// The table of a type that nothing but its name is told of.
+#define SCENE_NO_ATTRIBUTES(X)
 
 } // namespace scene

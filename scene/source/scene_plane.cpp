@@ -1,0 +1,160 @@
+#include "scene_plane.h"
+
+#include <algorithm>
+#include <array>
+#include <cfloat>
+#include <cmath>
+
+namespace scene {
+
+using base::u32;
+using base::vec2d;
+using base::vec3d;
+using base::vec3f;
+
+namespace {
+
+/// Corners up to which comparing all pairs beats sorting.
+constexpr std::size_t fewCorners = 24;
+
+vec3d subtract(const vec3f& a, const vec3f& b) {
+    return {double(a.x) - b.x, double(a.y) - b.y, double(a.z) - b.z};
+}
+
+vec3d cross(const vec3d& a, const vec3d& b) {
+    return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
+}
+
+double dot(const vec3d& a, const vec3d& b) {
+    return a.x * b.x + a.y * b.y + a.z * b.z;
+}
+
+double length(const vec3d& v) {
+    return std::sqrt(dot(v, v));
+}
+
+vec3d scaled(const vec3d& v, double factor) {
+    return {v.x * factor, v.y * factor, v.z * factor};
+}
+
+/// The cross product of the way to the farthest corner with the way to the one that lies farthest
+/// from that line: a normal for outlines whose signed area vanishes, like a figure of eight.
+vec3d widestCross(const base::vector<vec3f>& positions, std::span<const u32> corners,
+                  const vec3d& toFarthest) {
+    const vec3f origin = positions[corners[0]];
+    vec3d widest;
+    for (const u32 corner : corners) {
+        const vec3d n = cross(toFarthest, subtract(positions[corner], origin));
+        if (dot(n, n) > dot(widest, widest))
+            widest = n;
+    }
+    return widest;
+}
+
+} // namespace
+
+std::optional<vec3d> findPolygonNormal(const base::vector<vec3f>& positions,
+                                       std::span<const u32> corners) {
+    const vec3f origin = positions[corners[0]];
+    vec3d sum, previous, farthest;
+    double greatestSquare = 0;
+    for (const u32 corner : corners) {
+        const vec3d p = {positions[corner].x, positions[corner].y, positions[corner].z};
+        const vec3d way = {p.x - origin.x, p.y - origin.y, p.z - origin.z};
+        const vec3d n = cross(previous, way);
+        sum = {sum.x + n.x, sum.y + n.y, sum.z + n.z};
+        previous = way;
+        if (dot(way, way) > dot(farthest, farthest))
+            farthest = way;
+        const double square = dot(p, p);
+        if (square > greatestSquare || std::isnan(square)) // NaN stays
+            greatestSquare = square;
+    }
+    if (!std::isfinite(greatestSquare))
+        return std::nullopt;
+    // Coordinates are rounded to one part in 2^24, which widens a line to a sliver of this area.
+    const double rounding =
+        2 * double(FLT_EPSILON) * std::sqrt(greatestSquare) * length(farthest);
+    if (!(length(sum) > rounding))
+        sum = widestCross(positions, corners, farthest);
+    const double size = length(sum);
+    if (!(size > rounding))
+        return std::nullopt;
+    return scaled(sum, 1 / size);
+}
+
+void projectPolygon(const base::vector<vec3f>& positions, std::span<const u32> corners,
+                    const vec3d& normal, base::vector<vec2d>& outline) {
+    // The axis that lies flattest in the plane becomes the first direction, so that polygons in
+    // an axis plane keep their coordinates exactly.
+    const vec3d magnitude = {std::abs(normal.x), std::abs(normal.y), std::abs(normal.z)};
+    vec3d axis = {1, 0, 0};
+    if (magnitude.y < magnitude.x && magnitude.y <= magnitude.z)
+        axis = {0, 1, 0};
+    else if (magnitude.z < magnitude.x)
+        axis = {0, 0, 1};
+    vec3d v = cross(normal, axis);
+    v = scaled(v, 1 / length(v));
+    const vec3d u = cross(v, normal);
+
+    const vec3f origin = positions[corners[0]];
+    outline.resizeUninitialized(corners.size());
+    vec2d* to = outline.data();
+    for (const u32 corner : corners) {
+        const vec3d way = subtract(positions[corner], origin);
+        *to++ = {dot(way, u), dot(way, v)};
+    }
+}
+
+bool hasRepeatedPoint(std::span<const vec2d> outline, base::vector<vec2d>& scratch) {
+    if (outline.size() > fewCorners) {
+        scratch.assign(outline.begin(), outline.end());
+        std::sort(scratch.begin(), scratch.end());
+        return std::ranges::adjacent_find(std::as_const(scratch)) != scratch.cend();
+    }
+    // Without a branch on each comparison: there are few, and one mispredicted costs ten.
+    bool repeated = false;
+    for (std::size_t i = 1; i < outline.size(); ++i)
+        for (std::size_t j = 0; j < i; ++j)
+            repeated |= (outline[i].x == outline[j].x) & (outline[i].y == outline[j].y);
+    return repeated;
+}
+
+bool crossesItself(std::span<const vec2d> outline) {
+    const std::size_t count = outline.size();
+    const auto at = [&](std::size_t i) { return outline[i < count ? i : 0]; };
+    for (std::size_t i = 0; i + 2 < count; ++i) {
+        const vec2d a = outline[i], b = outline[i + 1];
+        double before = turn(a, b, outline[i + 2]);
+        for (std::size_t j = i + 2; j < count; ++j) {
+            const vec2d c = outline[j], d = at(j + 1);
+            const double after = turn(a, b, d);
+            if (before * after < 0 && turn(c, d, a) * turn(c, d, b) < 0)
+                return true;
+            before = after;
+        }
+    }
+    return false;
+}
+
+QuadDiagonal chooseDiagonal(const vec3f& p0, const vec3f& p1, const vec3f& p2, const vec3f& p3) {
+    const vec3d d02 = subtract(p2, p0);
+    const vec3d d13 = subtract(p3, p1);
+    const vec3d normal = cross(d02, d13);
+    const std::array<vec3f, 4> p = {p0, p1, p2, p3};
+    std::array<bool, 4> reflex;
+    for (std::size_t i = 0; i < 4; ++i) {
+        const vec3d in = subtract(p[i], p[(i + 3) % 4]);
+        const vec3d out = subtract(p[(i + 1) % 4], p[i]);
+        reflex[i] = dot(cross(in, out), normal) < 0;
+    }
+    if (std::ranges::count(reflex, true) == 1)
+        return reflex[0] || reflex[2] ? QuadDiagonal::from0 : QuadDiagonal::from1;
+    const auto lengthOf = [](const vec3d& v) {
+        const double l = length(v);
+        return l < double(FLT_EPSILON) ? 0 : l;
+    };
+    return lengthOf(d13) < lengthOf(d02) ? QuadDiagonal::from1 : QuadDiagonal::from0;
+}
+
+} // namespace scene
