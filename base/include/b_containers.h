@@ -62,7 +62,7 @@ public:
     explicit vector(size_type count) : vector() { resize(count); }
     vector(size_type count, const T& value) : vector() { resize(count, value); }
     vector(std::initializer_list<T> values) : vector() { append(values.begin(), values.end()); }
-    template <class It, class = typename std::iterator_traits<It>::iterator_category>
+    template <std::forward_iterator It>
     vector(It first, It last) : vector() {
         append(first, last);
     }
@@ -247,7 +247,7 @@ private:
     /// Makes owned room for `count` elements: exactly that at first, later in steps that keep
     /// repeated growth linear.
     void growFor(size_type count) {
-        if (isView() || count > capacity())
+        if (count > capacity()) // that of a view is 0
             reallocate(std::max(count, empty() ? 0 : grown()));
     }
 

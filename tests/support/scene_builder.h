@@ -25,7 +25,7 @@ public:
         if (!object)
             throw std::logic_error("the factory made another class");
         if (*name)
-            write(*object, nameAttribute) = name;
+            write(*object, nameAttribute) = base::string(name);
         return *object;
     }
     /// A new object among the children of `parent`.
