@@ -1,0 +1,79 @@
+#include "assimp/import_axes.h"
+
+#include <assimp/scene.h>
+
+#include <cmath>
+#include <optional>
+
+namespace assimp {
+
+using base::mat33f;
+using base::vec3f;
+
+namespace {
+
+/// A real number stored in any of the types that occur.
+std::optional<double> findNumber(const aiMetadata& data, const char* key) {
+    if (double value; data.Get(key, value))
+        return value;
+    if (float value; data.Get(key, value))
+        return value;
+    if (int value; data.Get(key, value))
+        return value;
+    return {};
+}
+
+/// One axis of the file with its sign as a row; zero if the entries are not there or no axis.
+vec3f findAxis(const aiMetadata& data, const char* key, const char* signKey) {
+    const double sign = findNumber(data, signKey).value_or(1) < 0 ? -1 : 1;
+    const double axis = findNumber(data, key).value_or(-1);
+    const auto along = [&](double number) { return static_cast<float>(axis == number ? sign : 0); };
+    return {along(0), along(1), along(2)};
+}
+
+/// Metres per unit; the file counts in centimetres.
+float findScale(const aiMetadata& data) {
+    const double factor = findNumber(data, "UnitScaleFactor").value_or(100);
+    return std::isfinite(factor) && factor > 0 ? static_cast<float>(factor * 0.01) : 1.0f;
+}
+
+vec3f cross(const vec3f& a, const vec3f& b) {
+    return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
+}
+
+vec3f operator*(const vec3f& v, float f) {
+    return {v.x * f, v.y * f, v.z * f};
+}
+
+} // namespace
+
+SceneAxes readAxes(const aiScene& source) {
+    SceneAxes result;
+    if (!source.mMetaData)
+        return result;
+    const aiMetadata& data = *source.mMetaData;
+    const float scale = findScale(data);
+    result.transform.m = {{scale, 0, 0}, {0, scale, 0}, {0, 0, scale}};
+
+    // To the right, up and to the viewer: the directions that become X, Y and Z.
+    const mat33f turn{findAxis(data, "CoordAxis", "CoordAxisSign"),
+                      findAxis(data, "UpAxis", "UpAxisSign"),
+                      findAxis(data, "FrontAxis", "FrontAxisSign")};
+    // Three axes, each once; else the entries are no frame.
+    const vec3f normal = cross(turn.r0, turn.r1);
+    if (normal == vec3f{} || (normal != turn.r2 && normal != turn.r2 * -1))
+        return result;
+
+    // The usual frames with X or Z up are left to the exporter, which knows just these.
+    constexpr mat33f xUp{{0, -1, 0}, {1, 0, 0}, {0, 0, 1}};
+    constexpr mat33f zUp{{1, 0, 0}, {0, 0, 1}, {0, -1, 0}};
+    if (turn == xUp)
+        result.upAxis = 0;
+    else if (turn == zUp)
+        result.upAxis = 2;
+    else
+        result.transform.m = {turn.r0 * scale, turn.r1 * scale, turn.r2 * scale};
+    return result;
+}
+
+} // namespace assimp

@@ -1,0 +1,147 @@
+#include "assimp/import_geometry.h"
+
+#include "assimp/import_polygons.h"
+#include "assimp/library_text.h"
+#include "assimp/vertex_selection.h"
+
+#include "b_log.h"
+#include "scene_schema.h"
+
+#include <assimp/mesh.h>
+
+#include <cstring>
+
+namespace assimp {
+
+using base::AttribMap;
+using base::u32;
+using base::u64;
+using base::vec3f;
+using base::vec4f;
+using base::vector;
+using scene::Presence;
+
+GeometrySettings::GeometrySettings(const AttribMap& importer) {
+    using Schema = scene::sceneImporter_schema;
+    meshes = read(importer, Schema::n_importMeshes);
+    lines = read(importer, Schema::n_importHair);
+    points = read(importer, Schema::n_importPoints);
+    triangulate = read(importer, Schema::n_importTriangulateMeshes);
+    flip = read(importer, Schema::n_flipNormals);
+    colors = read(importer, Schema::n_importColors);
+    textureCoordinates = read(importer, Schema::n_importTextureCoordinates);
+    multiIndex = Presence(read(importer, Schema::n_importMultiIndex));
+    normals = Presence(read(importer, Schema::n_importNormals));
+    tangents = Presence(read(importer, Schema::n_importTangents));
+    normalsMethod = scene::NormalsMethod(read(importer, Schema::n_computeNormalsMethod));
+    normalsAngle = read(importer, Schema::n_computeNormalsAngle);
+}
+
+void GeometryFaults::report(const base::string& path) const {
+    const auto tell = [&](int level, u64 count, const char* text) {
+        if (count != 0)
+            base::log().log(base::logScene, level, text, path, count);
+    };
+    tell(base::logInformation, degenerateFaces, "assimp |{}| Left out {} faces without area.");
+    tell(base::logWarning, brokenFaces,
+         "assimp |{}| Left out {} faces with an index out of range or more than 65535 corners!");
+    tell(base::logWarning, nonFiniteValues,
+         "assimp |{}| Found {} vertex values that are no finite numbers, zero is taken!");
+    tell(base::logWarning, zeroNormals,
+         "assimp |{}| Found {} normals without a direction, those of the faces are taken!");
+    tell(base::logWarning, zeroTangents,
+         "assimp |{}| Found {} tangents without a direction, any are taken!");
+}
+
+namespace {
+
+vector<vec3f> readPositions(const aiMesh& mesh, GeometryFaults& faults) {
+    vector<vec3f> positions;
+    positions.resizeUninitialized(mesh.mVertices ? mesh.mNumVertices : 0);
+    static_assert(sizeof(vec3f) == sizeof(aiVector3D));
+    if (!positions.empty())
+        std::memcpy(static_cast<void*>(positions.data()), mesh.mVertices, positions.byteLength());
+    faults.nonFiniteValues += repairValues(positions);
+    // Mirrored models have zeros of both signs; equal positions shall have equal bytes.
+    for (vec3f& p : positions)
+        p = {p.x + 0.0f, p.y + 0.0f, p.z + 0.0f};
+    return positions;
+}
+
+base::ref<base::IPlugin> createObject(base::PluginFactory& factory, base::name_id kind,
+                                      const aiMesh& mesh) {
+    base::ref<base::IPlugin> object = factory.create(kind);
+    if (mesh.mName.length != 0)
+        write(*object, scene::geometry_schema::n_name) = viewOf(mesh.mName);
+    return object;
+}
+
+vector<vec4f> readColors(const aiColor4D* elements, const VertexSelection& selection,
+                         GeometryFaults& faults) {
+    vector<vec4f> colors = selection.read<vec4f>(elements);
+    faults.nonFiniteValues += repairValues(colors);
+    return colors;
+}
+
+/// Segments of which each starts where the one before it ends form one line.
+base::ref<base::IPlugin> importLines(const aiMesh& mesh, const GeometrySettings& settings,
+                                     const vector<u32>& segments, const vector<vec3f>& positions,
+                                     base::PluginFactory& factory, GeometryFaults& faults) {
+    using Schema = scene::lines_schema;
+    vector<u32> vertices, starts;
+    for (std::size_t i = 0; i < segments.size(); i += 2) {
+        const u32 begin = segments[i];
+        if (i == 0 || positions[begin] != positions[segments[i - 1]]) {
+            starts.push_back(static_cast<u32>(vertices.size()));
+            vertices.push_back(begin);
+        }
+        vertices.push_back(segments[i + 1]);
+    }
+    const VertexSelection selection(std::move(vertices), mesh.mNumVertices);
+    base::ref<base::IPlugin> object = createObject(factory, Schema::n_kind, mesh);
+    write(*object, Schema::n_points) = selection.read<vec3f>(positions.data());
+    write(*object, Schema::n_linesStart) = std::move(starts);
+    if (settings.colors && mesh.mColors[0])
+        write(*object, Schema::n_colors) = readColors(mesh.mColors[0], selection, faults);
+    return object;
+}
+
+base::ref<base::IPlugin> importPoints(const aiMesh& mesh, vector<u32> vertices,
+                                      const vector<vec3f>& positions,
+                                      base::PluginFactory& factory) {
+    using Schema = scene::points_schema;
+    const VertexSelection selection(std::move(vertices), mesh.mNumVertices);
+    base::ref<base::IPlugin> object = createObject(factory, Schema::n_kind, mesh);
+    write(*object, Schema::n_points) = selection.read<vec3f>(positions.data());
+    return object;
+}
+
+} // namespace
+
+GeometryObjects importGeometry(const aiMesh& mesh, const GeometrySettings& settings,
+                               base::PluginFactory& factory, GeometryFaults& faults) {
+    vector<vec3f> positions = readPositions(mesh, faults);
+    MeshFaces faces = collectFaces(mesh, positions, settings.flip);
+    faults.degenerateFaces += faces.degenerateCount;
+    faults.brokenFaces += faces.brokenCount;
+
+    // The polygons come first in the list, but last here: they take the positions over.
+    base::ref<base::IPlugin> lines, points, polygons;
+    if (settings.lines && !faces.lines.empty())
+        lines = importLines(mesh, settings, faces.lines, positions, factory, faults);
+    if (settings.points && !faces.points.empty())
+        points = importPoints(mesh, std::move(faces.points), positions, factory);
+    if (settings.meshes && settings.triangulate)
+        triangulateFaces(faces, positions, base::string(viewOf(mesh.mName)));
+    if (settings.meshes && !faces.corners.empty()) {
+        polygons = createObject(factory, scene::mesh_schema::n_kind, mesh);
+        importPolygons(mesh, settings, std::move(faces), std::move(positions), *polygons, faults);
+    }
+    GeometryObjects objects;
+    for (const base::ref<base::IPlugin>& object : {polygons, lines, points})
+        if (object)
+            objects.push_back(object);
+    return objects;
+}
+
+} // namespace assimp

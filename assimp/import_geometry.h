@@ -1,0 +1,47 @@
+#pragma once
+
+#include "b_factory.h"
+#include "scene_options.h"
+
+struct aiMesh;
+
+namespace assimp {
+
+/// The settings of an import that concern geometry.
+struct GeometrySettings {
+    explicit GeometrySettings(const base::AttribMap& importer);
+
+    bool meshes, lines, points;
+    bool triangulate, flip;
+    bool colors, textureCoordinates;
+    scene::Presence multiIndex, normals, tangents;
+    scene::NormalsMethod normalsMethod;
+    float normalsAngle; ///< in degrees
+};
+
+/// What was wrong with the geometry of a file and was put right, counted for one report.
+struct GeometryFaults {
+    base::u64 degenerateFaces = 0;
+    base::u64 brokenFaces = 0;
+    base::u64 nonFiniteValues = 0;
+    base::u64 zeroNormals = 0;
+    base::u64 zeroTangents = 0;
+
+    /// Logs one line for each kind that occurred.
+    void report(const base::string& path) const;
+};
+
+using GeometryObjects = base::vector<base::ref<base::IPlugin>>;
+
+/// Makes the scene objects of one assimp mesh, which may hold faces of several kinds: at most one
+/// `mesh` (its polygons), one `lines` and one `points`. All carry the mesh's name.
+///
+/// Polygons stay as they are in the file. A mesh whose faces share vertices keeps its numbering
+/// in `indices`, less what no face uses. One with vertices of its own for each corner, which is
+/// what most readers deliver, gets its equal positions welded: `positions` with
+/// `positionIndices`, and one element per corner in every other array; the step to a single index
+/// then finds the vertices that are equal in everything.
+GeometryObjects importGeometry(const aiMesh& mesh, const GeometrySettings& settings,
+                               base::PluginFactory& factory, GeometryFaults& faults);
+
+} // namespace assimp

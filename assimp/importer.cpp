@@ -1,0 +1,176 @@
+#include "assimp/importer.h"
+
+#include "assimp/import_axes.h"
+#include "assimp/import_geometry.h"
+#include "assimp/import_nodes.h"
+#include "assimp/library_text.h"
+
+#include "b_log.h"
+#include "b_string_convert.h"
+#include "scene_schema.h"
+#include "stream/b_fs.h"
+
+#include <assimp/DefaultLogger.hpp>
+#include <assimp/Importer.hpp>
+#include <assimp/config.h>
+#include <assimp/scene.h>
+
+#include <algorithm>
+
+namespace assimp {
+
+namespace {
+
+/// Formats of the library's that are not offered, see `AssimpImporterDesc`. Motion files hold
+/// nothing but a skeleton and its animation.
+constexpr base::string_view excludedExtensions[] = {"gltf",    "glb",       "assbin", "bvh", "csm",
+                                                    "md5anim", "md5camera", "mot",    "vta"};
+
+base::string makeExtensionList() {
+    aiString all;
+    Assimp::Importer().GetExtensionList(all);
+    base::string list;
+    for (base::string_view entry : base::split(viewOf(all), ';')) {
+        entry.remove_prefix(std::min(entry.find_first_not_of("*."), entry.size()));
+        if (entry.empty() ||
+            std::ranges::find(excludedExtensions, entry) != std::end(excludedExtensions))
+            continue;
+        list.append(list.empty() ? "" : ";").append(entry);
+    }
+    return list;
+}
+
+const base::string& extensionList() {
+    static const base::string list = makeExtensionList();
+    return list;
+}
+
+/// Passes the library's messages on to the log, where they are of interest to whoever debugs.
+class LibraryMessages final : public Assimp::LogStream {
+public:
+    void write(const char* message) override {
+        base::log().log(base::logIO, base::logDebug, "assimp | {}", base::trimmed(message));
+    }
+};
+
+/// While it lives the library's messages are passed on, if the log takes any of that level. The
+/// library has no logger else and writes nowhere.
+class LibraryLog {
+public:
+    LibraryLog() : active_(base::log().levelLimit() >= base::logDebug) {
+        if (!active_)
+            return;
+        Assimp::DefaultLogger::create("", Assimp::Logger::NORMAL, 0);
+        Assimp::DefaultLogger::get()->attachStream(
+            new LibraryMessages, Assimp::Logger::Err | Assimp::Logger::Warn | Assimp::Logger::Info);
+    }
+    ~LibraryLog() {
+        if (active_)
+            Assimp::DefaultLogger::kill();
+    }
+    LibraryLog(const LibraryLog&) = delete;
+    LibraryLog& operator=(const LibraryLog&) = delete;
+
+private:
+    bool active_;
+};
+
+/// Null, with the reason in `error`, if the file can't be read. The steps of the library that
+/// change a scene are not used.
+std::unique_ptr<aiScene> readFile(const base::string& path, base::string& error) {
+    const LibraryLog log;
+    try {
+        Assimp::Importer importer;
+        // Files without meshes get none that show their skeleton.
+        importer.SetPropertyBool(AI_CONFIG_IMPORT_NO_SKELETON_MESHES, true);
+        // What the file's author wrote, not the ids beside it.
+        importer.SetPropertyBool(AI_CONFIG_IMPORT_COLLADA_USE_COLLADA_NAMES, true);
+        if (importer.ReadFile(base::fs::master().resolve(path), 0))
+            return std::unique_ptr<aiScene>(importer.GetOrphanedScene());
+        error = importer.GetErrorString();
+    } catch (const std::exception& e) {
+        error = e.what();
+    } catch (...) {
+        error = "Unknown error.";
+    }
+    return nullptr;
+}
+
+/// The objects of every mesh of the file. Each mesh is freed as soon as it has been taken over.
+base::vector<GeometryObjects> importMeshes(aiScene& source, const GeometrySettings& settings,
+                                           base::PluginFactory& factory, const base::string& path) {
+    base::vector<GeometryObjects> geometry;
+    GeometryFaults faults;
+    for (base::u32 i = 0; i < source.mNumMeshes; ++i) {
+        geometry.push_back(importGeometry(*source.mMeshes[i], settings, factory, faults));
+        delete source.mMeshes[i];
+        source.mMeshes[i] = nullptr;
+    }
+    faults.report(path);
+    return geometry;
+}
+
+} // namespace
+
+AssimpImporterDesc::AssimpImporterDesc() {
+    version = 1;
+    type = base::nameServer().id("AssimpImporter");
+    author = "The scene framework";
+    info = "Reads the model formats of the assimp library.";
+}
+
+base::IPlugin* AssimpImporterDesc::create(base::PluginFactory& factory, base::u32 id) {
+    return new AssimpImporter(this, &factory, id);
+}
+
+const base::string& AssimpImporterDesc::importExtensions() const {
+    return extensionList();
+}
+
+const base::string& AssimpImporterDesc::exportExtensions() const {
+    static const base::string none;
+    return none;
+}
+
+bool AssimpImporter::canLoad(const base::string& path) {
+    const base::string name = base::toLower(base::fs::fileName(path));
+    const auto isSuffix = [&](base::string_view extension) {
+        return name.size() > extension.size() && name.ends_with(extension) &&
+               name[name.size() - extension.size() - 1] == '.';
+    };
+    return std::ranges::any_of(base::split(extensionList(), ';'), isSuffix) &&
+           base::fs::master().exists(path);
+}
+
+bool AssimpImporter::load(base::PluginFactory& scene, const base::string& path) {
+    base::string error;
+    const std::unique_ptr<aiScene> source = readFile(path, error);
+    if (!source || !source->mRootNode) {
+        base::log().log(base::logIO, base::logError, "assimp |{}| Unable to read the file: {}",
+                        path, source ? "It has no nodes." : base::string(base::trimmed(error)));
+        return false;
+    }
+    const base::vector<GeometryObjects> geometry =
+        importMeshes(*source, GeometrySettings(*this), scene, path);
+    const SceneAxes axes = readAxes(*source);
+    base::ref<base::IPlugin> root =
+        importNodes(*source->mRootNode, axes.transform, geometry, scene);
+
+    using Schema = scene::scene_schema;
+    const base::ref<base::IPlugin> object = scene.create(Schema::n_kind);
+    write(*object, Schema::n_name) = base::fs::stem(path);
+    write(*object, Schema::n_root) = std::move(root);
+    if (axes.upAxis != Schema::n_upAxis.defaultValue)
+        write(*object, Schema::n_upAxis) = axes.upAxis;
+    return true;
+}
+
+void registerPlugin(base::PluginFactory& factory) {
+    scene::register_scene_schema(factory);
+    scene::register_viewport_schema(factory);
+    scene::register_importer_schema();
+    scene::register_exporter_schema();
+    factory.registerDesc(base::makeRef<AssimpImporterDesc>());
+}
+
+} // namespace assimp

@@ -1,0 +1,50 @@
+#pragma once
+
+#include "scene_factory.h"
+
+/// Import plugin for the model formats that the assimp library reads.
+namespace assimp {
+
+/// The plugin's description, of type "AssimpImporter". It reads everything that the library does
+/// but glTF, which this system never reads, the library's own format, and formats that hold
+/// animation only.
+class AssimpImporterDesc final : public scene::IScenePluginDesc {
+public:
+    AssimpImporterDesc();
+    base::IPlugin* create(base::PluginFactory& factory, base::u32 id) override;
+    const base::string& importExtensions() const override;
+    const base::string& exportExtensions() const override;
+};
+
+/// Reads one file. Its settings do the following; those not listed have no effect:
+///
+/// | setting | effect |
+/// |---|---|
+/// | `importMeshes`, `importHair`, `importPoints` | polygons, line faces and points are read |
+/// | `importTriangulateMeshes` | polygons are cut into triangles |
+/// | `importColors`, `importTextureCoordinates` | the sets of meshes and lines are read |
+/// | `importMultiIndex` | never: meshes get one index per vertex at once; else where needed |
+/// | `importNormals` | never; present: those of the file; always: computed where it has none |
+/// | `computeNormalsMethod`, `computeNormalsAngle` | how they are computed |
+/// | `importTangents`, `computeTangentsMethod` | the same; need normals, and texture coordinates to
+/// be computed | | `flipNormals` | faces are wound the other way, normals negated |
+///
+/// No format of the library's gives edges apart from line faces, surfaces or subdivision as such,
+/// or velocities, so `importEdges`, `importSurfaces`, `importTriangulateSurfaces`,
+/// `importSubdivision`, `importTessellation` and `importVelocities` mean nothing here, and there is
+/// one `computeTangentsMethod`.
+class AssimpImporter final : public scene::SceneImportPlugin {
+public:
+    using scene::SceneImportPlugin::SceneImportPlugin;
+
+    /// True if the file exists and its extension is among those of the description.
+    bool canLoad(const base::string& path) override;
+    /// Adds a `scene` object with the file's tree of nodes. What the library can't read is logged
+    /// as one error; nothing is added then.
+    bool load(base::PluginFactory& scene, const base::string& path) override;
+};
+
+/// Registers the schemas and the description with `factory`.
+void registerPlugin(base::PluginFactory& factory);
+
+} // namespace assimp

@@ -1,0 +1,58 @@
+#pragma once
+
+#include <algorithm>
+#include <string>
+
+namespace test_support {
+
+/// The parts of a small FBX file that differ between tests.
+struct FbxText {
+    /// Up, front and right axis with sign, centimetres per unit.
+    int up = 1, upSign = 1, front = 2, frontSign = 1, right = 0, rightSign = 1;
+    std::string unit = "1";
+    std::string layers;     ///< elements of the geometry, a square from the origin in the XY plane
+    std::string properties; ///< of the model "panel", which has the geometry
+
+    std::string text() const {
+        const auto number = [](const char* name, int value) {
+            return std::string("P: \"") + name + "\", \"int\", \"Integer\", \"\"," +
+                   std::to_string(value) + "\n";
+        };
+        return "; FBX 7.4.0 project file\n"
+               "FBXHeaderExtension:  {\nFBXHeaderVersion: 1003\nFBXVersion: 7400\n}\n"
+               "GlobalSettings:  {\nVersion: 1000\nProperties70:  {\n" +
+               number("UpAxis", up) + number("UpAxisSign", upSign) + number("FrontAxis", front) +
+               number("FrontAxisSign", frontSign) + number("CoordAxis", right) +
+               number("CoordAxisSign", rightSign) +
+               "P: \"UnitScaleFactor\", \"double\", \"Number\", \"\"," + unit +
+               "\n}\n}\nObjects:  {\n"
+               "Geometry: 10, \"Geometry::square\", \"Mesh\" {\n"
+               "Vertices: *12 {\na: 0,0,0,1,0,0,1,1,0,0,1,0\n}\n"
+               "PolygonVertexIndex: *4 {\na: 0,1,2,-4\n}\nGeometryVersion: 124\n" +
+               layers +
+               "}\n"
+               "Model: 20, \"Model::panel\", \"Mesh\" {\nVersion: 232\nProperties70:  {\n" +
+               properties +
+               "}\n}\n"
+               "Model: 21, \"Model::child\", \"Null\" {\nVersion: 232\n}\n}\n"
+               "Connections:  {\nC: \"OO\",20,0\nC: \"OO\",10,20\nC: \"OO\",21,20\n}\n";
+    }
+
+    static std::string vectorProperty(const std::string& name, const std::string& values) {
+        return "P: \"" + name + "\", \"Vector3D\", \"Vector\", \"\"," + values + "\n";
+    }
+    /// An element with one value for each corner. `array` names its values.
+    static std::string layer(const std::string& kind, const std::string& array, int index,
+                             const std::string& name, const std::string& values) {
+        return "LayerElement" + kind + ": " + std::to_string(index) + " {\nVersion: 101\nName: \"" +
+               name +
+               "\"\nMappingInformationType: \"ByPolygonVertex\"\n"
+               "ReferenceInformationType: \"Direct\"\n" +
+               array + ": *" + std::to_string(std::count(values.begin(), values.end(), ',') + 1) +
+               " {\na: " + values + "\n}\n}\n" + "Layer: " + std::to_string(index) +
+               " {\nVersion: 100\nLayerElement:  {\nType: \"LayerElement" + kind +
+               "\"\nTypedIndex: " + std::to_string(index) + "\n}\n}\n";
+    }
+};
+
+} // namespace test_support

@@ -1,0 +1,120 @@
+#include "import_fixture.h"
+
+#include "b_string_convert.h"
+
+namespace {
+
+using namespace scene;
+using base::string;
+using test_support::Import;
+using test_support::LogCapture;
+
+const char* const triangle = "v 0 0 0\nv 1 0 0\nv 0 1 0\nf 1 2 3\n";
+
+class Importer : public Import {
+protected:
+    ISceneImporter& importer() {
+        object_ = importers_.create(base::nameServer().id("AssimpImporter"));
+        return *findInterface<ISceneImporter>(*object_);
+    }
+    base::ref<base::IPlugin> object_;
+};
+
+TEST_F(Importer, ListsTheLibrarysFormatsButGltf) {
+    const string list = importers_.getImporterExtensions();
+    for (const auto extension : base::split(list, ';')) {
+        EXPECT_FALSE(extension.empty());
+        EXPECT_EQ(extension.find_first_of("* "), string::npos) << extension;
+    }
+    for (const char* extension : {"obj", "fbx", "dae", "ply", "stl", "3ds", "x", "off", "blend"})
+        EXPECT_TRUE(importers_.hasImporter(extension)) << extension;
+    for (const char* extension : {"gltf", "glb", "assbin", "bvh", "", "png"})
+        EXPECT_FALSE(importers_.hasImporter(extension)) << extension;
+    EXPECT_EQ(importers_.getExporterExtensions(), "");
+}
+
+TEST_F(Importer, LoadsFilesThatExistAndHaveAReader) {
+    EXPECT_TRUE(importer().canLoad(write("A b.OBJ", triangle)));
+    EXPECT_TRUE(importer().canLoad(write("v1.2.mesh.xml", "")));
+    EXPECT_FALSE(importer().canLoad(write("notes.txt", triangle)));
+    EXPECT_FALSE(importer().canLoad(write("obj", triangle)));
+    EXPECT_FALSE(importer().canLoad((folder_ / "missing.obj").string()));
+}
+
+TEST_F(Importer, UnicodeAndBlanksInNames) {
+    std::filesystem::create_directory(folder_ / "ein Ordner ü");
+    ASSERT_TRUE(load("ein Ordner ü/Größe 1 модель 😀.obj",
+                     "mtllib Stoffe à la carte.mtl\no Würfel_1\n" + string(triangle)));
+    EXPECT_EQ(only(scene_schema::n_kind).getName(), "Größe 1 модель 😀");
+    EXPECT_EQ(mesh().getName(), "Würfel_1");
+}
+
+TEST_F(Importer, FilesThatCannotBeReadGiveOneErrorAndNothingElse) {
+    const struct {
+        const char* name;
+        string text;
+    } cases[] = {
+        {"empty.stl", ""},
+        {"empty.obj", ""},
+        {"cut.dae", "<COLLADA"},
+        {"cut.fbx", string("Kaydara FBX Binary  \0\x1a\0\xff\x1c\0\0", 27)},
+        {"text.ply", "This is no model, but some text that is long enough for a header."},
+        {"old.fbx", "; FBX 6.1.0 project file\nFBXHeaderExtension:  {\nFBXVersion: 6100\n}\n"},
+        {"text.3ds", "This is no model."},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.name);
+        const string path = write(c.name, c.text);
+        LogCapture log;
+        testing::internal::CaptureStdout();
+        testing::internal::CaptureStderr();
+        const bool loaded = loadPath(path);
+        EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+        EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
+        EXPECT_FALSE(loaded);
+        EXPECT_EQ(document_->pluginCount(), 0u);
+        base::vector<LogCapture::Entry> problems;
+        for (const auto& entry : log.entries())
+            if (entry.level <= base::logWarning)
+                problems.push_back(entry);
+        ASSERT_EQ(problems.size(), 1u);
+        EXPECT_EQ(problems[0].level, base::logError);
+        EXPECT_EQ(problems[0].channel, base::logIO);
+        const string start = "assimp |" + path + "| Unable to read the file: ";
+        EXPECT_TRUE(problems[0].text.starts_with(start)) << problems[0].text;
+        EXPECT_GT(problems[0].text.size(), start.size());
+    }
+}
+
+TEST_F(Importer, MessagesOfTheLibraryAreForDebugging) {
+    const string path = write("model.obj", "mtllib missing.mtl\n" + string(triangle));
+    LogCapture log;
+    ASSERT_TRUE(loadPath(path));
+    bool found = false;
+    for (const auto& entry : log.entries()) {
+        EXPECT_EQ(entry.level, base::logDebug) << entry.text;
+        found |= entry.text.find("missing.mtl") != string::npos;
+    }
+    EXPECT_TRUE(found);
+    log.take();
+    base::log().setLevelLimit(base::logInformation);
+    ASSERT_TRUE(loadPath(path));
+    EXPECT_TRUE(log.entries().empty());
+}
+
+TEST_F(Importer, WorksAsAModule) {
+    std::filesystem::create_symlink(TEST_MODULE, folder_ / "scene_assimp.so");
+    SceneFactory factory;
+    factory.loadFrom(folder_.string() + "/");
+    const string path = write("model.obj", triangle);
+    base::AttribMap parameters;
+    ASSERT_TRUE(factory.getImporterParameters(path, parameters));
+    EXPECT_TRUE(parameters.findAttribute(Settings::n_importMeshes));
+    ASSERT_TRUE(factory.load(factory, path, parameters));
+    const auto object = factory.firstOfType(scene_schema::n_kind);
+    ASSERT_TRUE(object);
+    EXPECT_TRUE(findObject(*object, scene_schema::n_root));
+    EXPECT_TRUE(factory.firstOfType(mesh_schema::n_kind));
+}
+
+} // namespace
