@@ -80,15 +80,16 @@ public:
     /// `stringId`, or type name, "_" and `id` where that is empty.
     string getStringId() const;
 
+private:
+    friend class Walk;
+    u32 walkMark_ = 0; ///< number of the last walk that took this object
+
+public:
     i32 id = -1; ///< index in the top-level array of its kind; -1 until it is written
     string stringId;
     string name; ///< written where not empty
     flat_map<string, ref<Extension>> extensions;
     flat_map<string, ref<Object>> extras;
-
-private:
-    friend class Walk;
-    u32 walkMark_ = 0; ///< number of the last walk that took this object
 };
 
 class Extension : public Object {
@@ -106,6 +107,8 @@ public:
     /// Owns a copy of `data`, or (without `copy`) borrows it.
     Buffer(const void* data, i32 byteLength, bool copy);
     ~Buffer() override;
+    /// A buffer that owns `byteLength` zero bytes.
+    static ref<Buffer> zeroed(i32 byteLength);
     string typeName() const override;
     void writeJSON(JsonWriter& writer, const Options& options) override;
 
