@@ -128,8 +128,7 @@ void INode::getTransform(base::mat43& transform, const base::mat43* parentWorld)
     if (read(*this, n_inheritsTransform))
         return;
     base::mat43 undo, freed;
-    if (parentWorld && invert(*parentWorld, undo) &&
-        fitsFloats(freed = multiply(undo, transform)))
+    if (parentWorld && invert(*parentWorld, undo) && fitsFloats(freed = multiply(undo, transform)))
         transform = freed;
     else
         warnOnce(warnedParent, "The transform can't be freed of its parent's, the parent is "

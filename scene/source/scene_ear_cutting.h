@@ -1,37 +1,9 @@
 #pragma once
 
-#include "scene_plane.h"
+#include "scene_point_tree.h"
 
 /// Triangulation of outlines of any kind by cutting off ears.
 namespace scene {
-
-/// The points of an outline sorted into the cells of a grid, for the question which of them lie
-/// in or near a triangle.
-class PointGrid {
-public:
-    struct Item {
-        base::vec2d point;
-        base::u32 corner;
-    };
-    void build(std::span<const base::vec2d> points);
-    /// Calls `use` with runs of items, among them all that are in the triangle or within `margin`
-    /// of it, until it answers true; returns whether it did.
-    template <class Use>
-    bool anyRun(const std::array<base::vec2d, 3>& triangle, double margin, Use use) const;
-    /// Greater of the sides of the box round all points.
-    double extent() const { return extent_; }
-
-private:
-    base::u32 column(double x) const;
-    base::u32 row(double y) const;
-
-    base::vec2d min_;
-    double extent_ = 0;
-    double cellSize_ = 0;
-    base::u32 columnCount_ = 1, rowCount_ = 1;
-    base::vector<base::u32> starts_; ///< of each cell in `items_`, row by row, and the end
-    base::vector<Item> items_;
-};
 
 /// Cuts one outline after another; keeps its working memory between them.
 ///
@@ -42,9 +14,11 @@ private:
 class EarCutter {
 public:
     /// Appends triangles, all turning to the left, of an outline that as a whole turns to the
-    /// left. False if a full turn round the rest of the outline finds no ear, or if the search
-    /// takes too long for the number of corners.
-    bool cut(std::span<const base::vec2d> outline, base::vector<Triangle>& triangles);
+    /// left. Corners that are no farther than `precision` from an edge count as on it. False if a
+    /// full turn round the rest of the outline finds no ear, or if the search takes too long for
+    /// the number of corners.
+    bool cut(std::span<const base::vec2d> outline, double precision,
+             base::vector<Triangle>& triangles);
     /// The corners that the last `cut` left over, in order.
     base::vector<base::u32> remainingCorners() const;
 
@@ -55,7 +29,8 @@ private:
     void queueAll();
     bool isEar(base::u32 corner, const Search& search);
     bool isBlocked(base::u32 corner, const Search& search);
-    void cutOff(base::u32 corner, base::vector<Triangle>& triangles);
+    bool isSpike(base::u32 corner) const;
+    void cutOff(base::u32 ear, base::vector<Triangle>& triangles);
 
     struct Corner {
         base::u32 previous, next;
@@ -67,8 +42,9 @@ private:
     base::u32 first_ = 0; ///< one of the corners that are left
     base::u32 remaining_ = 0;
     double flatTurn_ = 0; ///< turns up to this are rounding
+    double precision_ = 0;
     base::u64 work_ = 0;
-    PointGrid grid_;
+    PointTree tree_;
     base::vector<base::u32> queue_;
     std::size_t queueHead_ = 0;
 };

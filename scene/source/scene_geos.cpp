@@ -16,19 +16,19 @@ namespace {
 constexpr const char* libraryName = "libgeos_c.so.1";
 
 /// X(name): the functions of the library that are called.
-#define SCENE_GEOS_FUNCTIONS(X)                                                                    \
-    X(GEOS_init_r)                                                                                 \
-    X(GEOS_finish_r)                                                                               \
-    X(GEOSContext_setErrorMessageHandler_r)                                                        \
-    X(GEOSCoordSeq_copyFromBuffer_r)                                                               \
-    X(GEOSCoordSeq_copyToBuffer_r)                                                                 \
-    X(GEOSGeom_createLinearRing_r)                                                                 \
-    X(GEOSGeom_createPolygon_r)                                                                    \
-    X(GEOSGeom_destroy_r)                                                                          \
-    X(GEOSConstrainedDelaunayTriangulation_r)                                                      \
-    X(GEOSGetNumGeometries_r)                                                                      \
-    X(GEOSGetGeometryN_r)                                                                          \
-    X(GEOSGetExteriorRing_r)                                                                       \
+#define SCENE_GEOS_FUNCTIONS(X)               \
+    X(GEOS_init_r)                            \
+    X(GEOS_finish_r)                          \
+    X(GEOSContext_setErrorMessageHandler_r)   \
+    X(GEOSCoordSeq_copyFromBuffer_r)          \
+    X(GEOSCoordSeq_copyToBuffer_r)            \
+    X(GEOSGeom_createLinearRing_r)            \
+    X(GEOSGeom_createPolygon_r)               \
+    X(GEOSGeom_destroy_r)                     \
+    X(GEOSConstrainedDelaunayTriangulation_r) \
+    X(GEOSGetNumGeometries_r)                 \
+    X(GEOSGetGeometryN_r)                     \
+    X(GEOSGetExteriorRing_r)                  \
     X(GEOSGeom_getCoordSeq_r)
 
 #define SCENE_GEOS_POINTER(name) decltype(&::name) name = nullptr;
@@ -110,16 +110,17 @@ GEOSGeometry* makePolygon(GEOSContextHandle_t context, const base::vector<vec3d>
 /// The corner at exactly that point, whose number the third coordinate should be; the number of
 /// corners where there is none.
 u32 findCorner(const vec3d& point, std::span<const vec2d> outline) {
-    const auto isAt = [&](const vec2d& corner) { return corner.x == point.x && corner.y == point.y; };
+    const auto isAt = [&](const vec2d& corner) {
+        return corner.x == point.x && corner.y == point.y;
+    };
     const u32 noted = base::saturate<u32>(point.z);
     if (noted < outline.size() && isAt(outline[noted]))
         return noted;
     return static_cast<u32>(std::ranges::find_if(outline, isAt) - outline.begin());
 }
 
-bool readTriangle(const GeosLibrary& lib, GEOSContextHandle_t context,
-                  const GEOSGeometry* triangle, std::span<const vec2d> outline,
-                  Triangle& corners) {
+bool readTriangle(const GeosLibrary& lib, GEOSContextHandle_t context, const GEOSGeometry* triangle,
+                  std::span<const vec2d> outline, Triangle& corners) {
     const GEOSGeometry* ring = triangle ? lib.GEOSGetExteriorRing_r(context, triangle) : nullptr;
     const GEOSCoordSequence* points = ring ? lib.GEOSGeom_getCoordSeq_r(context, ring) : nullptr;
     std::array<vec3d, 4> closed; // the first point comes twice
@@ -177,14 +178,16 @@ bool DelaunayTriangulator::triangulate(std::span<const vec2d> outline,
         return false;
     const std::size_t before = triangles.size();
     const int count = lib.GEOSGetNumGeometries_r(context, result.get());
-    for (int i = 0; i < count; ++i) {
+    bool whole = count == static_cast<int>(outline.size()) - 2;
+    for (int i = 0; whole && i < count; ++i) {
         const GEOSGeometry* triangle = lib.GEOSGetGeometryN_r(context, result.get(), i);
-        if (!readTriangle(lib, context, triangle, outline, triangles.emplace_back())) {
-            triangles.resize(before);
-            return false;
-        }
+        whole = readTriangle(lib, context, triangle, outline, triangles.emplace_back());
     }
-    return true;
+    if (!whole) {
+        error_ = "the triangles don't make up the polygon";
+        triangles.resize(before);
+    }
+    return whole;
 }
 
 } // namespace scene

@@ -12,9 +12,8 @@ using base::u32;
 namespace {
 
 template <class T>
-std::unique_ptr<base::Attribute> gatherElements(const Channel& channel,
-                                                const base::vector<u32>& firstCorner,
-                                                bool& outOfRange) {
+std::unique_ptr<base::Attribute>
+gatherElements(const Channel& channel, const base::vector<u32>& firstCorner, bool& outOfRange) {
     auto result = std::make_unique<base::TypedVectorAttribute<T>>();
     result->value().resizeUninitialized(firstCorner.size());
     T* to = result->value().data();

@@ -21,10 +21,10 @@ struct Channel {
     base::name_id name;
     const void* data = nullptr;
     base::u32 count = 0;
-    base::u32 wordCount = 0;             ///< 32-bit words of an element
-    bool isKey = true; ///< tells vertices apart; velocities don't, they belong to positions
+    base::u32 wordCount = 0; ///< 32-bit words of an element
+    bool isKey = true;       ///< tells vertices apart; velocities don't, they belong to positions
     const base::vector<base::u32>* ownIndices = nullptr; ///< its own index array, null if none
-    base::u32 invalidIndex = noIndex;    ///< index that stands for an element of zeros
+    base::u32 invalidIndex = noIndex; ///< index that stands for an element of zeros
     GatherFunction gather = nullptr;
     /// Entry of each corner in the array; null: the number of the corner itself.
     const base::u32* indexOfCorner = nullptr;

@@ -88,8 +88,8 @@ bool SingleIndexConversion::run() {
         return false;
     }
     addressChannels();
-    const bool allIndexed = std::ranges::all_of(
-        channels_, [](const Channel& c) { return !c.isKey || c.ownIndices; });
+    const bool allIndexed =
+        std::ranges::all_of(channels_, [](const Channel& c) { return !c.isKey || c.ownIndices; });
     if (allIndexed)
         makeTupleColumns();
     else

@@ -63,8 +63,8 @@ std::unique_ptr<base::Attribute> makeArray(vector<T> values) {
 
 } // namespace
 
-void rewriteJointsSet(AttribMap& set, u32 setIndex, const base::string& meshName,
-                      u32 positionCount, const vector<u32>& positionOfVertex, MeshEdit& edit) {
+void rewriteJointsSet(AttribMap& set, u32 setIndex, const base::string& meshName, u32 positionCount,
+                      const vector<u32>& positionOfVertex, MeshEdit& edit) {
     const base::name_id countsName = meshJointsSet_schema::n_jointCounts;
     vector<u64> starts;
     u64 entryCount = 0;

@@ -9,8 +9,8 @@ namespace scene {
 
 /// The corner counts of a primitive's faces ("vcounts"): one for all, or one for each.
 struct FaceSizes {
-    bool known = false;                           ///< false where nothing is stored
-    base::u32 single = 0;                         ///< of every face; valid without `list`
+    bool known = false;                            ///< false where nothing is stored
+    base::u32 single = 0;                          ///< of every face; valid without `list`
     const base::vector<base::u16>* list = nullptr; ///< of each face, borrowed from the primitive
 
     bool isSingle(base::u32 size) const { return known && !list && single == size; }

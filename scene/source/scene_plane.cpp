@@ -14,8 +14,9 @@ using base::vec3f;
 
 namespace {
 
-/// Corners up to which comparing all pairs beats sorting.
-constexpr std::size_t fewCorners = 24;
+/// Part of the extent of an outline within which points are taken to touch: far more than
+/// coordinates in double precision are uncertain, so that what passes is simple beyond doubt.
+constexpr double contact = 1e-12;
 
 vec3d subtract(const vec3f& a, const vec3f& b) {
     return {double(a.x) - b.x, double(a.y) - b.y, double(a.z) - b.z};
@@ -53,8 +54,12 @@ vec3d widestCross(const base::vector<vec3f>& positions, std::span<const u32> cor
 
 } // namespace
 
-std::optional<vec3d> findPolygonNormal(const base::vector<vec3f>& positions,
-                                       std::span<const u32> corners) {
+double distance(const vec2d& a, const vec2d& b) {
+    return std::sqrt((b.x - a.x) * (b.x - a.x) + (b.y - a.y) * (b.y - a.y));
+}
+
+std::optional<PolygonPlane> findPlane(const base::vector<vec3f>& positions,
+                                      std::span<const u32> corners) {
     const vec3f origin = positions[corners[0]];
     vec3d sum, previous, farthest;
     double greatestSquare = 0;
@@ -73,14 +78,14 @@ std::optional<vec3d> findPolygonNormal(const base::vector<vec3f>& positions,
     if (!std::isfinite(greatestSquare))
         return std::nullopt;
     // Coordinates are rounded to one part in 2^24, which widens a line to a sliver of this area.
-    const double rounding =
-        2 * double(FLT_EPSILON) * std::sqrt(greatestSquare) * length(farthest);
+    const double precision = 2 * double(FLT_EPSILON) * std::sqrt(greatestSquare);
+    const double rounding = precision * length(farthest);
     if (!(length(sum) > rounding))
         sum = widestCross(positions, corners, farthest);
     const double size = length(sum);
     if (!(size > rounding))
         return std::nullopt;
-    return scaled(sum, 1 / size);
+    return PolygonPlane{scaled(sum, 1 / size), precision};
 }
 
 void projectPolygon(const base::vector<vec3f>& positions, std::span<const u32> corners,
@@ -106,35 +111,63 @@ void projectPolygon(const base::vector<vec3f>& positions, std::span<const u32> c
     }
 }
 
-bool hasRepeatedPoint(std::span<const vec2d> outline, base::vector<vec2d>& scratch) {
-    if (outline.size() > fewCorners) {
-        scratch.assign(outline.begin(), outline.end());
-        std::sort(scratch.begin(), scratch.end());
-        return std::ranges::adjacent_find(std::as_const(scratch)) != scratch.cend();
+namespace {
+
+struct Edge {
+    vec2d from, to;
+    double turn(const vec2d& p) const { return scene::turn(from, to, p); }
+    /// Whether a point on the edge's line lies between its ends.
+    bool spans(const vec2d& p) const {
+        const double x = to.x - from.x, y = to.y - from.y;
+        const double along = x * (p.x - from.x) + y * (p.y - from.y);
+        return along >= 0 && along <= x * x + y * y;
     }
-    // Without a branch on each comparison: there are few, and one mispredicted costs ten.
-    bool repeated = false;
-    for (std::size_t i = 1; i < outline.size(); ++i)
-        for (std::size_t j = 0; j < i; ++j)
-            repeated |= (outline[i].x == outline[j].x) & (outline[i].y == outline[j].y);
-    return repeated;
+};
+
+/// Compares an edge with the chain of all corners but its own.
+OutlineFault findFaultOfEdge(const Edge& edge, const vec2d* chain, std::size_t count,
+                             double nearTurn) {
+    OutlineFault fault = OutlineFault::none;
+    double before = 0;
+    for (std::size_t i = 0; i < count; ++i) {
+        const double turned = edge.turn(chain[i]);
+        const bool passes = before * turned < 0;
+        before = turned;
+        if (!passes && !(std::abs(turned) <= nearTurn))
+            continue;
+        const Edge other = {chain[i - passes], chain[i]};
+        if (passes && other.turn(edge.from) * other.turn(edge.to) < 0)
+            return OutlineFault::crossing;
+        if (std::abs(turned) <= nearTurn && edge.spans(chain[i]))
+            fault = OutlineFault::contact;
+    }
+    return fault;
 }
 
-bool crossesItself(std::span<const vec2d> outline) {
+} // namespace
+
+OutlineFault findFault(std::span<const vec2d> outline, base::vector<vec2d>& scratch) {
     const std::size_t count = outline.size();
-    const auto at = [&](std::size_t i) { return outline[i < count ? i : 0]; };
-    for (std::size_t i = 0; i + 2 < count; ++i) {
-        const vec2d a = outline[i], b = outline[i + 1];
-        double before = turn(a, b, outline[i + 2]);
-        for (std::size_t j = i + 2; j < count; ++j) {
-            const vec2d c = outline[j], d = at(j + 1);
-            const double after = turn(a, b, d);
-            if (before * after < 0 && turn(c, d, a) * turn(c, d, b) < 0)
-                return true;
-            before = after;
-        }
+    scratch.assign(outline.begin(), outline.end());
+    scratch.append(outline.begin(), outline.end());
+    const vec2d* ring = std::as_const(scratch).data();
+    const vec2d& first = ring[0];
+    double extent = 0;
+    for (std::size_t i = 1; i < count; ++i)
+        extent = std::max({extent, std::abs(ring[i].x - first.x), std::abs(ring[i].y - first.y)});
+
+    OutlineFault fault = OutlineFault::none;
+    for (std::size_t i = 0; i < count; ++i) {
+        const Edge edge = {ring[i], ring[i + 1]};
+        const double length = distance(edge.from, edge.to);
+        const OutlineFault found =
+            findFaultOfEdge(edge, ring + i + 2, count - 2, contact * extent * length);
+        if (found == OutlineFault::crossing)
+            return found;
+        if (found == OutlineFault::contact)
+            fault = found;
     }
-    return false;
+    return fault;
 }
 
 QuadDiagonal chooseDiagonal(const vec3f& p0, const vec3f& p1, const vec3f& p2, const vec3f& p3) {

@@ -18,21 +18,31 @@ inline double turn(const base::vec2d& a, const base::vec2d& b, const base::vec2d
     return (b.x - a.x) * (c.y - a.y) - (b.y - a.y) * (c.x - a.x);
 }
 
-/// Unit normal of the polygon whose corners are `corners` (indices of `positions`), in the sense
-/// that its outline turns to the left seen against the normal. None for corners that lie on a
-/// line within the precision of their coordinates, or that are not finite.
-std::optional<base::vec3d> findPolygonNormal(const base::vector<base::vec3f>& positions,
-                                             std::span<const base::u32> corners);
+double distance(const base::vec2d& a, const base::vec2d& b);
 
-/// The corners in the plane through the first one with that normal, in units of the positions.
+/// The plane of a polygon, through its first corner.
+struct PolygonPlane {
+    base::vec3d normal;   ///< of unit length; against it the outline is seen to turn to the left
+    double precision = 0; ///< how far from their true places corners may lie, being rounded
+};
+
+/// The plane of the polygon whose corners are `corners` (indices of `positions`). None for corners
+/// that lie on a line within their precision, or that are not finite.
+std::optional<PolygonPlane> findPlane(const base::vector<base::vec3f>& positions,
+                                      std::span<const base::u32> corners);
+
+/// The corners in a plane with that normal, the first at the origin, in units of the positions.
 void projectPolygon(const base::vector<base::vec3f>& positions, std::span<const base::u32> corners,
                     const base::vec3d& normal, base::vector<base::vec2d>& outline);
 
-/// True if two corners have the same point. `scratch` is memory that is kept between calls.
-bool hasRepeatedPoint(std::span<const base::vec2d> outline, base::vector<base::vec2d>& scratch);
-
-/// True if two edges of the outline cross. Edges that only touch do not. Quadratic time.
-bool crossesItself(std::span<const base::vec2d> outline);
+/// What keeps an outline from being simple.
+enum class OutlineFault {
+    none,
+    contact, ///< a corner lies on an edge or on another corner
+    crossing ///< two edges cross; it outweighs contacts
+};
+/// Takes quadratic time. `scratch` is memory that is kept between calls.
+OutlineFault findFault(std::span<const base::vec2d> outline, base::vector<base::vec2d>& scratch);
 
 /// Where the two triangles of a quad meet.
 enum class QuadDiagonal { from0, from1 };

@@ -38,16 +38,15 @@ struct PolygonTriangulator::Impl {
     void cutPolygon(std::span<const u32> corners, base::vector<u32>& output);
     bool cutByDelaunay();
     void failDelaunay(const base::string& reason);
-    bool makeUpOutline() const;
-    void cutByEars();
+    void cutByEars(double precision);
     bool cutSimply();
     void outputTriangles(const u32* corners, base::vector<u32>& output) const;
 
     const base::vector<vec3f>& positions;
     const base::string name;
     base::vector<vec2d> outline;
+    base::vector<vec2d> scratch;
     base::vector<Triangle> triangles; ///< of the present polygon, in corners of the outline
-    base::vector<vec2d> sortedPoints;
     DelaunayTriangulator delaunay;
     EarCutter ears;
 };
@@ -96,18 +95,18 @@ void PolygonTriangulator::Impl::cutQuad(const u32* corners, base::vector<u32>& o
 
 void PolygonTriangulator::Impl::cutPolygon(std::span<const u32> corners,
                                            base::vector<u32>& output) {
-    const std::optional<base::vec3d> normal = findPolygonNormal(positions, corners);
-    if (!normal) {
+    const std::optional<PolygonPlane> plane = findPlane(positions, corners);
+    if (!plane) {
         log().log(logScene, logError,
                   "triangulate| {}| Can't calculate the polygon normal for plane projection, "
                   "skipping!",
                   name);
         return;
     }
-    projectPolygon(positions, corners, *normal, outline);
+    projectPolygon(positions, corners, plane->normal, outline);
     triangles.clear();
     if (!cutByDelaunay())
-        cutByEars();
+        cutByEars(plane->precision);
     outputTriangles(corners.data(), output);
 }
 
@@ -117,23 +116,21 @@ bool PolygonTriangulator::Impl::cutByDelaunay() {
         failDelaunay(base::format("more than {} corners", maxDelaunayCorners));
         return false;
     }
-    if (hasRepeatedPoint(outline, sortedPoints)) {
-        failDelaunay("repeated points");
-        return false;
-    }
-    if (crossesItself(outline)) {
+    switch (findFault(outline, scratch)) {
+    case OutlineFault::crossing:
         log().log(logScene, logWarning,
                   "triangulate |{}| Polygon self intersection detected, falling back to earcut!",
                   name);
         return false;
+    case OutlineFault::contact:
+        // The library never comes to an end with some of these.
+        failDelaunay("the outline touches itself");
+        return false;
+    case OutlineFault::none:
+        break;
     }
     if (!delaunay.triangulate(outline, triangles)) {
         failDelaunay(delaunay.error());
-        return false;
-    }
-    if (!makeUpOutline()) {
-        triangles.clear();
-        failDelaunay("the triangles don't make up the polygon");
         return false;
     }
     return true;
@@ -144,20 +141,8 @@ void PolygonTriangulator::Impl::failDelaunay(const base::string& reason) {
               "triangulate |{}| Error detected - '{}', falling back to earcut!", name, reason);
 }
 
-/// True if the triangles together are as large as the outline. The library answers without an
-/// error for some outlines that touch themselves, but not with all of it.
-bool PolygonTriangulator::Impl::makeUpOutline() const {
-    double trianglesTurn = 0;
-    for (const Triangle& t : triangles)
-        trianglesTurn += turn(outline[t[0]], outline[t[1]], outline[t[2]]);
-    double outlineTurn = 0;
-    for (std::size_t i = 2; i < outline.size(); ++i)
-        outlineTurn += turn(outline[0], outline[i - 1], outline[i]);
-    return std::abs(trianglesTurn - outlineTurn) <= 1e-9 * trianglesTurn;
-}
-
-void PolygonTriangulator::Impl::cutByEars() {
-    if (ears.cut(outline, triangles))
+void PolygonTriangulator::Impl::cutByEars(double precision) {
+    if (ears.cut(outline, precision, triangles))
         return;
     log().log(logScene, logWarning,
               "triangulate |{}| Error detected - falling back to simple triangulation!", name);
@@ -187,8 +172,8 @@ void PolygonTriangulator::Impl::outputTriangles(const u32* corners,
     for (const Triangle& t : triangles) {
         const double area = std::abs(turn(outline[t[0]], outline[t[1]], outline[t[2]])) / 2;
         if (!(area >= leastArea)) {
-            log().log(logScene, base::logDebug,
-                      "triangulate {}| Dropping triangle with zero area!", name);
+            log().log(logScene, base::logDebug, "triangulate {}| Dropping triangle with zero area!",
+                      name);
             continue;
         }
         const u32 cut[] = {corners[t[0]], corners[t[1]], corners[t[2]]};

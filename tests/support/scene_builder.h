@@ -25,7 +25,7 @@ public:
         if (!object)
             throw std::logic_error("the factory made another class");
         if (*name)
-            write(*object, nameAttribute) = base::string(name);
+            write(*object, scene::node_schema::n_name) = base::string(name);
         return *object;
     }
     /// A new object among the children of `parent`.
@@ -42,9 +42,6 @@ public:
     base::ref<scene::SceneFactory> factory = base::makeRef<scene::SceneFactory>();
     scene::IScene* scene;
     scene::INode* root;
-
-private:
-    static constexpr auto& nameAttribute = scene::node_schema::n_name;
 };
 
 /// Appends a map to one of the lists of a mesh or morph.
@@ -55,23 +52,21 @@ inline base::AttribMap& appendItem(base::AttribMap& object,
     return *item;
 }
 
-/// Appends a primitive of faces with `corners` corners each.
-inline base::AttribMap& appendPrimitive(scene::IMesh& mesh, base::u16 corners) {
+/// Appends a primitive of faces with `corners` corners each: all of the index array, or `count`
+/// entries of it from `start` on.
+inline base::AttribMap& appendPrimitive(scene::IMesh& mesh, base::u16 corners, base::i64 start = -1,
+                                        base::u32 count = 0) {
     using scene::meshPrimitive_schema;
     base::AttribMap& primitive = appendItem(mesh, scene::mesh_schema::n_primitives);
     write(primitive, meshPrimitive_schema::n_vcounts) = {corners};
-    return primitive;
-}
-/// The same for `count` entries of the index array from `start` on.
-inline base::AttribMap& appendPrimitive(scene::IMesh& mesh, base::u16 corners, base::u32 start,
-                                        base::u32 count) {
-    using scene::meshPrimitive_schema;
-    base::AttribMap& primitive = appendPrimitive(mesh, corners);
-    write(primitive, meshPrimitive_schema::n_indexStart) = start;
-    write(primitive, meshPrimitive_schema::n_indexCount) = count;
+    if (start >= 0) {
+        write(primitive, meshPrimitive_schema::n_indexStart) = static_cast<base::u32>(start);
+        write(primitive, meshPrimitive_schema::n_indexCount) = count;
+    }
     return primitive;
 }
 
+/// The array of a new set of texture coordinates, and of colours.
 inline base::vector<base::vec2f>& appendUVs(scene::IMesh& mesh) {
     return write(appendItem(mesh, scene::mesh_schema::n_uvSets), scene::meshUVSet_schema::n_UV);
 }
@@ -91,21 +86,16 @@ inline scene::IMesh& makeTriangle(scene::IMesh& mesh) {
 /// with normals and texture coordinates.
 inline scene::IMesh& makeGrid(scene::IMesh& mesh, base::u32 size) {
     auto& uvs = appendUVs(mesh);
-    auto& positions = write(mesh, scene::mesh_schema::n_positions);
-    auto& normals = write(mesh, scene::mesh_schema::n_normals);
     auto& indices = write(mesh, scene::mesh_schema::n_indices);
-    for (base::u32 y = 0; y <= size; ++y) {
-        for (base::u32 x = 0; x <= size; ++x) {
-            const auto fx = static_cast<float>(x), fy = static_cast<float>(y);
-            positions.push_back({fx, fy, 0});
-            normals.push_back({0, 0, 1});
-            uvs.push_back({fx / static_cast<float>(size), fy / static_cast<float>(size)});
-            if (x < size && y < size) {
-                const base::u32 a = y * (size + 1) + x, b = a + size + 1;
-                for (const base::u32 index : {a, a + 1, b + 1, a, b + 1, b})
-                    indices.push_back(index);
-            }
-        }
+    for (base::u32 i = 0; i < (size + 1) * (size + 1); ++i) {
+        const base::u32 x = i % (size + 1), y = i / (size + 1), above = i + size + 1;
+        const auto fx = static_cast<float>(x), fy = static_cast<float>(y);
+        write(mesh, scene::mesh_schema::n_positions).push_back({fx, fy, 0});
+        write(mesh, scene::mesh_schema::n_normals).push_back({0, 0, 1});
+        uvs.push_back({fx / static_cast<float>(size), fy / static_cast<float>(size)});
+        if (x < size && y < size)
+            for (const base::u32 index : {i, i + 1, above + 1, i, above + 1, above})
+                indices.push_back(index);
     }
     appendPrimitive(mesh, 3);
     return mesh;
