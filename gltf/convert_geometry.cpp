@@ -1,0 +1,282 @@
+#include "gltf/exporter.h"
+#include "gltf/vertex_array.h"
+
+#include "b_log.h"
+#include "scene_mesh.h"
+#include "scene_mesh_index.h"
+#include "scene_mesh_triangulate.h"
+#include "scene_schema.h"
+
+#include <algorithm>
+#include <numeric>
+
+namespace gltf {
+
+using base::AttribMap;
+using base::i32;
+using base::log;
+using base::logError;
+using base::logScene;
+using base::ref;
+using base::string;
+using base::u32;
+using base::u64;
+using scene::mesh_schema;
+using scene::meshPrimitive_schema;
+
+/// The index array that the primitives of a mesh share; a mesh may have none.
+class MeshIndices {
+public:
+    explicit MeshIndices(const scene::IMesh& mesh);
+
+    const u32* data() const { return data_; }
+    u64 count() const { return count_; }
+    u32 vertexCount() const { return vertexCount_; }
+    bool isTriangulated() const { return isTriangulated_; }
+    /// Entries that ranges may address: without an array, the vertices in their order.
+    u64 rangeEnd() const { return data_ ? count_ : vertexCount_; }
+
+    /// Makes the array that lists all vertices in their order.
+    void number();
+    /// A view of the whole array, which the document borrows if it lasts, else copies.
+    ref<GLTF::BufferView> makeView(const scene::IMesh& mesh) const;
+    /// Position of the first index in the array that leads past the vertices; `count` if none does.
+    u64 findOutOfRange() const;
+
+private:
+    const u32* data_ = nullptr;
+    u64 count_ = 0;
+    u32 vertexCount_ = 0;
+    bool isTriangulated_ = false;
+    bool mustCopy_ = false;
+    base::vector<u32> own_;
+};
+
+namespace {
+
+/// glTF's mode for a type of primitive, -1 for what it does not know.
+i32 modeOf(i32 primitiveType) {
+    switch (primitiveType) {
+    case scene::primitivePoints:
+        return 0;
+    case scene::primitiveLines:
+        return 1;
+    case scene::primitiveLineStrip:
+        return 3;
+    case scene::primitiveTriangles:
+        return 4;
+    case scene::primitiveTriangleStrip:
+        return 5;
+    case scene::primitiveTriangleFan:
+        return 6;
+    default:
+        return -1;
+    }
+}
+
+/// The type of a primitive as it is drawn: faces are triangles once the mesh is triangulated, all
+/// other kinds stay what they are.
+i32 drawnType(const scene::IMesh& mesh, u32 index, bool isTriangulated) {
+    const i32 type = getPrimitiveType(mesh, index, false);
+    switch (type) {
+    case scene::primitivePoints:
+    case scene::primitiveLines:
+    case scene::primitiveLineStrip:
+    case scene::primitiveTriangleStrip:
+    case scene::primitiveTriangleFan:
+        return type;
+    default:
+        return isTriangulated ? i32(scene::primitiveTriangles) : type;
+    }
+}
+
+struct IndexRange {
+    u64 start = 0;
+    u64 count = 0;
+};
+
+const u32* findFirst(const AttribMap& primitive, const scene::SchemaAttribute<u32>& first,
+                     const scene::SchemaAttribute<u32>& second) {
+    const u32* value = find(primitive, first);
+    return value ? value : find(primitive, second);
+}
+
+/// The stored range of a primitive, which may lead past the end. The only primitive of a
+/// triangulated mesh has all triangles if its range is that of the former faces.
+IndexRange storedRange(const AttribMap& primitive, const MeshIndices& indices, bool isOnlyOne) {
+    if (isOnlyOne && indices.isTriangulated() &&
+        !find(primitive, meshPrimitive_schema::n_triIndexCount))
+        return {0, indices.count()};
+    const u32* start = findFirst(primitive, meshPrimitive_schema::n_triIndexStart,
+                                 meshPrimitive_schema::n_indexStart);
+    const u32* count = findFirst(primitive, meshPrimitive_schema::n_triIndexCount,
+                                 meshPrimitive_schema::n_indexCount);
+    return {start ? *start : 0, count ? *count : indices.rangeEnd()};
+}
+
+IndexRange clampedRange(IndexRange range, u64 end, const scene::IMesh& mesh) {
+    if (range.start + range.count <= end)
+        return range;
+    log().log(logScene, logError, "validate |{}| Index offset/count out of bounds {}-{} out of {}!",
+              mesh.getName(), range.start, range.count, end);
+    range.start = std::min(range.start, end);
+    range.count = std::min(range.count, end - range.start);
+    return range;
+}
+
+ref<GLTF::Accessor> makeIndices(IndexRange range, const ref<GLTF::BufferView>& view) {
+    auto accessor = base::makeRef<GLTF::Accessor>(GLTF::Accessor::Type::scalar, GLTF::componentU32,
+                                                  static_cast<i32>(range.start * sizeof(u32)),
+                                                  static_cast<i32>(range.count), view);
+    accessor->computeMinMax();
+    return accessor;
+}
+
+u32 countPrimitives(const scene::IMesh& mesh) {
+    const u32 listCount = getListCount(mesh, mesh_schema::n_primitives);
+    u32 count = 0;
+    for (u32 i = 0; i < listCount; ++i)
+        count += findListItem(mesh, mesh_schema::n_primitives, i) != nullptr;
+    return count;
+}
+
+} // namespace
+
+MeshIndices::MeshIndices(const scene::IMesh& mesh) {
+    const auto use = [&](const scene::SchemaAttribute<base::vector<u32>>& name) {
+        const auto* array = find(mesh, name);
+        if (!array || array->empty())
+            return false;
+        data_ = array->data();
+        count_ = array->size();
+        mustCopy_ = !mayBorrow(mesh, name);
+        return true;
+    };
+    isTriangulated_ = use(mesh_schema::n_triIndices);
+    // Only a mesh that could not be converted to single indices has position indices still.
+    if (!isTriangulated_ && !use(mesh_schema::n_indices))
+        use(mesh_schema::n_positionIndices);
+    if (const auto* positions = find(mesh, mesh_schema::n_positions))
+        vertexCount_ = static_cast<u32>(positions->size());
+}
+
+void MeshIndices::number() {
+    own_.resizeUninitialized(vertexCount_);
+    std::iota(own_.begin(), own_.end(), 0u);
+    data_ = std::as_const(own_).data();
+    count_ = own_.size();
+    mustCopy_ = true;
+}
+
+ref<GLTF::BufferView> MeshIndices::makeView(const scene::IMesh& mesh) const {
+    if (!data_)
+        return nullptr;
+    return base::makeRef<GLTF::BufferView>(data_, checkedLength(count_ * sizeof(u32), mesh),
+                                           GLTF::BufferView::elementArrayBuffer, mustCopy_);
+}
+
+u64 MeshIndices::findOutOfRange() const {
+    const u32 end = vertexCount_;
+    return static_cast<u64>(
+        std::find_if(data_, data_ + count_, [end](u32 index) { return index >= end; }) - data_);
+}
+
+namespace {
+
+/// True if an index of one of the primitives leads past the vertices.
+bool hasIndexOutOfRange(const GLTF::Mesh& gltfMesh, const MeshIndices& indices) {
+    // The bounds are there already. As floats they order like the indices, but for equality.
+    const float vertexCount = static_cast<float>(indices.vertexCount());
+    const bool maybe =
+        std::ranges::any_of(gltfMesh.primitives, [&](const ref<GLTF::Primitive>& primitive) {
+            return primitive->indices && primitive->indices->max[0] >= vertexCount;
+        });
+    return maybe && indices.findOutOfRange() != indices.count();
+}
+
+} // namespace
+
+ref<GLTF::Mesh> GLTFScenePlugin::convertMesh(scene::IMesh& mesh, bool withTargets) {
+    convertToSingleIndex(mesh, morphBases_.contains(&mesh));
+    triangulate(mesh, false, true);
+
+    auto gltfMesh = base::makeRef<GLTF::Mesh>();
+    if (const string* name = find(mesh, scene::geometry_schema::n_name))
+        gltfMesh->name = *name;
+    MeshIndices indices(mesh);
+    const bool allTriangles = convertPrimitives(*gltfMesh, mesh, indices);
+    if (gltfMesh->primitives.empty()) {
+        log().log(logScene, base::logWarning, "validate |{}| Mesh doesn't contain any primitives!",
+                  mesh.getName());
+        return nullptr;
+    }
+    if (!convertMeshAttributes(*gltfMesh, mesh)) {
+        log().log(logScene, logError, "validate |{}| The vertex positions are missing!",
+                  mesh.getName());
+        return gltfMesh;
+    }
+    if (hasIndexOutOfRange(*gltfMesh, indices))
+        log().log(logScene, logError, "validate |{}| Found face index out of range at position {}!",
+                  mesh.getName(), indices.findOutOfRange());
+    else if (exportCompress && !withTargets && allTriangles)
+        compressMesh(*gltfMesh, mesh, indices);
+    return gltfMesh;
+}
+
+/// Returns whether all primitives are lists of triangles.
+bool GLTFScenePlugin::convertPrimitives(GLTF::Mesh& gltfMesh, scene::IMesh& mesh,
+                                        MeshIndices& indices) {
+    const u32 listCount = getListCount(mesh, mesh_schema::n_primitives);
+    const u32 primitiveCount = countPrimitives(mesh);
+    ref<GLTF::BufferView> view = indices.makeView(mesh);
+    bool allTriangles = true;
+    u64 drawnCount = 0;
+    gltfMesh.primitives.reserve(primitiveCount);
+    for (u32 i = 0; i < listCount; ++i) {
+        const AttribMap* source = findListItem(mesh, mesh_schema::n_primitives, i);
+        if (!source)
+            continue;
+        const IndexRange range = clampedRange(storedRange(*source, indices, primitiveCount == 1),
+                                              indices.rangeEnd(), mesh);
+        // Without indices every primitive would draw all vertices.
+        if (!view && (primitiveCount > 1 || range.count < indices.vertexCount())) {
+            indices.number();
+            view = indices.makeView(mesh);
+        }
+        if (range.count == 0 && indices.rangeEnd() != 0)
+            continue;
+        // Many primitives that all take the whole array make a huge document of a small mesh.
+        drawnCount += range.count;
+        checkedLength(drawnCount * sizeof(u32), mesh);
+
+        const i32 type = drawnType(mesh, i, indices.isTriangulated());
+        allTriangles &= type == scene::primitiveTriangles;
+        // No material: the primitive shows the default one of the reader.
+        auto primitive = base::makeRef<GLTF::Primitive>();
+        primitive->mode = modeOf(type);
+        if (primitive->mode < 0)
+            log().log(logScene, base::logWarning,
+                      "gltf |{}| Primitive {} is of no kind that can be drawn!", mesh.getName(), i);
+        if (view)
+            primitive->indices = makeIndices(range, view);
+        gltfMesh.primitives.push_back(std::move(primitive));
+    }
+    return allTriangles;
+}
+
+/// Prepares one Draco stream of all indices, which the primitives share.
+void GLTFScenePlugin::compressMesh(GLTF::Mesh& gltfMesh, const scene::IMesh& mesh,
+                                   const MeshIndices& indices) {
+    string reason;
+    const auto extension = GLTF::DracoExtension::make(
+        std::as_const(gltfMesh).primitives[0]->attributes, indices.data(), indices.count(), reason);
+    if (!extension) {
+        log().log(logScene, logError, "gltf |{}| The mesh can't be compressed, it stays plain: {}!",
+                  mesh.getName(), reason);
+        return;
+    }
+    for (const ref<GLTF::Primitive>& primitive : gltfMesh.primitives)
+        primitive->extensions[GLTF::dracoExtensionName] = extension;
+}
+
+} // namespace gltf

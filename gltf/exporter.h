@@ -1,0 +1,98 @@
+#pragma once
+
+#include "GLTF/document.h"
+#include "scene.h"
+#include "scene_factory.h"
+
+/// The export plugin: turns the objects of a scene into a glTF document and writes its files.
+namespace gltf {
+
+class MeshIndices;
+struct TreePosition;
+
+/// An exporter; one object serves one export. Its settings are its attributes, and during the
+/// export its members of the same names. The conversions are public so that each can be used by
+/// itself; they read the settings and the tables and add to the tables.
+///
+/// The tables hold plain pointers: the document owns what they point at. The document borrows the
+/// bulk arrays of the scene's objects until the data is packed, so nothing may change these
+/// meanwhile. Single-indexing and triangulation change the meshes of the scene in place.
+class GLTFScenePlugin final : public scene::SceneExportPlugin {
+public:
+    GLTFScenePlugin(base::ref<base::IPluginDesc> desc, base::PluginFactory* factory, base::u32 id);
+    ~GLTFScenePlugin() override;
+
+    /// Writes the first object of type "scene" to `path`, as a container if its extension is
+    /// "glb" and as text otherwise, with side files beside it if the settings ask for them.
+    /// False, silently, if there is no scene or it has no root node. A file that could not be
+    /// written is logged and does not change the result; what fails before that is thrown, and
+    /// then nothing has been written. Exports of all threads run one after the other.
+    bool exportScene(base::PluginFactory& sceneObjects, const base::string& path) override;
+
+    /// Fills `gltfNode`, whose name and transform are set, from the children of the node at
+    /// `position`: child nodes first, depth first, then the other objects in their order.
+    void convertNode(GLTF::Node& gltfNode, const TreePosition& position);
+    /// Sets the transform of `gltfNode`: a matrix, or translation, rotation and scale for a node
+    /// that is animated.
+    void convertTransform(const TreePosition& position, GLTF::Node& gltfNode);
+    /// Gives the mesh to `gltfNode` or, if that has one, to a new child of it. Returns the node
+    /// that took it.
+    GLTF::Node* attachMesh(GLTF::Node& gltfNode, base::ref<GLTF::Mesh> mesh);
+
+    /// A new mesh with one primitive per primitive of `mesh` that draws anything; null if there
+    /// is none. `withTargets` is for a mesh that will get morph targets, which rule out Draco.
+    base::ref<GLTF::Mesh> convertMesh(scene::IMesh& mesh, bool withTargets);
+    /// Sets the attributes of all primitives. False, with nothing done, without positions.
+    bool convertMeshAttributes(GLTF::Mesh& gltfMesh, scene::IMesh& mesh);
+    /// Adds one target to each primitive of `gltfMesh`, which was made of `baseMesh`. The target
+    /// holds differences to the base or, with `isWholeShape`, absolute values, of which the
+    /// differences are made here. False, with a message and nothing added, if the two do not fit
+    /// together, and without one if the target has no positions.
+    bool convertMorphTarget(GLTF::Mesh& gltfMesh, const scene::IMesh& targetMesh,
+                            const scene::IMesh& baseMesh, bool isWholeShape);
+    /// A new mesh with one primitive of single lines; null if there are none. `hasAssignment` is
+    /// for the edges of a mesh: they stand off its surface and are drawn in one colour.
+    base::ref<GLTF::Mesh> convertLines(scene::ILines& lines, bool hasAssignment);
+
+    /// The nodes of joints that the tree holds.
+    base::hash_map<const scene::INode*, GLTF::Node*> nodeMap;
+    // What each geometry became: shared ones are converted once. Null for what failed.
+    base::hash_map<const scene::IMesh*, GLTF::Mesh*> meshMap;
+    base::hash_map<const scene::ILines*, GLTF::Mesh*> linesMap;
+    base::u32 linesIndex = 0; ///< number of lines converted so far
+
+private:
+    void prepareObjects(base::PluginFactory& sceneObjects);
+    base::ref<GLTF::Node> convertRoot(const scene::INode& root, base::u8 upAxis);
+    GLTF::Options makeOptions(const base::string& path) const;
+    base::ref<GLTF::Asset> makeAsset(const base::ref<GLTF::Node>& gltfRoot) const;
+    void clearTables();
+
+    void convertChildNode(GLTF::Node& gltfNode, base::IPlugin& child, const TreePosition& parent);
+    bool mayPlace(const scene::INode& child, const TreePosition& parent);
+    void convertObject(GLTF::Node& gltfNode, base::IPlugin& child);
+    void convertMeshChild(GLTF::Node& gltfNode, base::IPlugin& child, bool withTargets);
+    void convertLinesChild(GLTF::Node& gltfNode, base::IPlugin& child);
+
+    bool convertPrimitives(GLTF::Mesh& gltfMesh, scene::IMesh& mesh, MeshIndices& indices);
+    void compressMesh(GLTF::Mesh& gltfMesh, const scene::IMesh& mesh, const MeshIndices& indices);
+    GLTF::Material* getEdgeMaterial(const scene::ILines& lines);
+
+    /// Meshes that morph objects deform: their vertices must stay apart where the targets' do.
+    base::set<const base::IPlugin*> morphBases_;
+    /// The nodes with child nodes that the walk has met; true while it is below them.
+    base::hash_map<const scene::INode*, bool> walkedNodes_;
+    base::u32 nodeCount_ = 0; ///< nodes placed in the tree
+    base::ref<GLTF::MaterialPBR> edgeMaterial_;
+};
+
+/// A node of the scene at its place in the tree, which is known only during the walk.
+struct TreePosition {
+    const scene::INode& node;
+    const TreePosition* parent = nullptr; ///< null at the root
+    base::u32 level = 1;                  ///< 1 at the root
+    bool isAnimated = false;              ///< its transform is linked to an animation layer
+    base::mat43 parentFromNode{};
+};
+
+} // namespace gltf

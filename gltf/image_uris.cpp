@@ -1,0 +1,77 @@
+#include "gltf/image_uris.h"
+
+#include "b_log.h"
+#include "b_string_convert.h"
+#include "stream/b_fs.h"
+
+namespace gltf {
+
+using base::string;
+using base::string_view;
+using GLTF::Image;
+
+namespace {
+
+bool haveEqualData(const Image& a, const Image& b) {
+    return a.byteLength == b.byteLength &&
+           std::memcmp(a.data, b.data, static_cast<std::size_t>(a.byteLength)) == 0;
+}
+
+/// `uri` with `number` behind its name: "a.png" becomes "a_2.png".
+string numbered(const string& uri, int number) {
+    const string extension = base::fs::extension(uri);
+    const std::size_t nameLength = uri.size() - (extension.empty() ? 0 : extension.size() + 1);
+    return uri.substr(0, nameLength) + "_" + std::to_string(number) + uri.substr(nameLength);
+}
+
+/// Which files are taken, and by the data of which image.
+class TakenFiles {
+public:
+    explicit TakenFiles(const string& folder)
+        : folder_(folder), current_(base::fs::master().curdir()) {}
+
+    /// The picture that an image was read from must stay as it is.
+    void addSource(const Image& image) {
+        if (!image.cacheKey.empty())
+            files_.try_emplace(keyOf(image.cacheKey), &image);
+    }
+    /// True if the file of that uri is free for the image or holds the same data; it is taken
+    /// then.
+    bool take(const string& uri, const Image& image) {
+        const auto [entry, isNew] = files_.try_emplace(keyOf(folder_ + uri), &image);
+        return isNew || haveEqualData(*entry->second, image);
+    }
+
+private:
+    /// One text for all ways to name a file.
+    string keyOf(const string& path) const {
+        const string resolved = base::fs::master().resolve(path);
+        return base::toLower(base::fs::normalized(base::fs::joined(current_, resolved)));
+    }
+
+    string folder_;
+    string current_;
+    base::map<string, const Image*> files_;
+};
+
+} // namespace
+
+void makeUrisUnique(const base::vector<Image*>& images, const string& folder) {
+    TakenFiles taken(folder);
+    for (const Image* image : images) {
+        if (image->data)
+            taken.addSource(*image);
+    }
+    for (Image* image : images) {
+        if (!image->data || taken.take(image->uri, *image))
+            continue;
+        const string uri = image->uri;
+        for (int number = 2; !taken.take(image->uri, *image); ++number)
+            image->uri = numbered(uri, number);
+        base::log().log(base::logScene, base::logWarning,
+                        "gltf |{}| Another image is called so, the file is written as '{}'!", uri,
+                        image->uri);
+    }
+}
+
+} // namespace gltf

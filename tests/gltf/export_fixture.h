@@ -1,0 +1,69 @@
+#pragma once
+
+#include "support/gltf_faults.h"
+#include "support/gltf_reader.h"
+#include "support/log_capture.h"
+#include "support/scene_builder.h"
+
+#include "b_exception.h"
+#include "gltf/plugin_desc.h"
+
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <functional>
+#include <gtest/gtest.h>
+
+namespace test_support {
+
+/// A folder that is removed at the end.
+class TempFolder {
+public:
+    TempFolder() {
+        if (!::mkdtemp(path_.data()))
+            throw std::runtime_error("no temporary folder");
+    }
+    ~TempFolder() { std::filesystem::remove_all(path_); }
+    std::string operator/(const std::string& name) const { return path_ + "/" + name; }
+
+private:
+    std::string path_ = (std::filesystem::temp_directory_path() / "gltf_test_XXXXXX").string();
+};
+
+inline std::string readText(const std::string& path) {
+    const Bytes bytes = readBytes(path);
+    return {bytes.begin(), bytes.end()};
+}
+
+/// A scene that is exported the way a host does it, uncompressed unless a test asks for it.
+struct Exporting : SceneBuilder {
+    using Settings = scene::sceneExporter_schema;
+
+    Exporting() {
+        gltf::registerPlugin(*factory);
+        set(Settings::n_exportCompress, false);
+    }
+    template <class T>
+    void set(base::name_id setting, const T& value) {
+        settings.attribute<T>(setting) = value;
+    }
+    bool save(const std::string& path) { return factory->save(*factory, path, settings); }
+    GltfFile saveAndRead(const std::string& name = "scene.glb") {
+        EXPECT_TRUE(save(folder / name));
+        return GltfFile::read(folder / name);
+    }
+
+    TempFolder folder;
+    base::AttribMap settings;
+};
+
+/// The messages of level 3 and below as lines, each with its level in front.
+inline std::string problems(const LogCapture& log) {
+    std::string text;
+    for (const LogCapture::Entry& entry : log.entries())
+        if (entry.level <= base::logWarning)
+            text += base::format("{} {}\n", entry.level, entry.text);
+    return text;
+}
+
+} // namespace test_support
