@@ -1,0 +1,43 @@
+#pragma once
+
+#include "b_containers.h"
+#include "b_types.h"
+
+#include <optional>
+
+namespace host {
+
+struct WrittenFile {
+    base::string path;
+    base::u64 bytes = 0;
+};
+
+/// What stands in a glTF document. Triangles are those of the meshes, each mesh once; those of
+/// compressed primitives are counted as their accessors declare them.
+struct DocumentCounts {
+    base::u64 nodes = 0;
+    base::u64 meshes = 0;
+    base::u64 triangles = 0;
+    base::u64 materials = 0;
+    base::u64 images = 0;
+    base::u64 animations = 0;
+
+    // The bytes of all files by kind, as they lie there: embedded data counts with its encoding.
+    base::u64 jsonBytes = 0; ///< the text without the data, and what frames the parts
+    base::u64 geometryBytes = 0;
+    base::u64 imageBytes = 0;
+};
+
+/// What an export has written.
+struct Output {
+    base::vector<WrittenFile> files;        ///< the main file, then those that it refers to
+    std::optional<DocumentCounts> document; ///< none if the main file is no glTF document
+
+    base::u64 totalBytes() const;
+};
+
+/// Reads the main file `path` and looks for the files that it refers to. Throws
+/// `base::exception` if it can't be read or is broken.
+Output readOutput(const base::string& path);
+
+} // namespace host

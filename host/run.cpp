@@ -1,0 +1,201 @@
+#include "host/run.h"
+
+#include "host/crash_guard.h"
+#include "host/paths.h"
+#include "host/printing.h"
+
+#include "b_string_convert.h"
+#include "scene_schema.h"
+#include "stream/b_fs.h"
+
+#include <new>
+
+namespace host {
+
+using base::AttribMap;
+using base::string;
+
+namespace {
+
+/// Calls `work`; what it throws becomes a `Failure` with `code` that tells of `path`.
+template <class Work>
+void attempt(ExitCode code, const string& path, const Work& work) {
+    try {
+        work();
+    } catch (const Failure&) {
+        throw;
+    } catch (const std::bad_alloc&) {
+        throw Failure(code, path + ": there is not enough memory for it.");
+    } catch (const std::exception& e) {
+        throw Failure(code, path + ": " + e.what());
+    } catch (...) {
+        throw Failure(code, path + ": an unknown exception was thrown.");
+    }
+}
+
+/// Tells how far the run is, for the bar.
+void tellProgress(base::u32 percent, const char* what, const string& path) {
+    base::log().progress(percent, base::format("{} {}", what, base::fs::fileName(path)));
+}
+
+/// Replaces the content of the file.
+void writeFile(const string& path, const string& text) {
+    base::Stream stream;
+    base::fs::master().open(stream, path, base::fs::openReplace);
+    stream.setFlags(stream.flags() | base::streamThrowOnShortWrite);
+    stream.write(text.data(), text.size());
+    stream.close();
+}
+
+} // namespace
+
+Run::Run(scene::SceneFactory& factory, const CommandLine& line,
+         const base::CmdLineOptions& registered, const Messages& messages, StageClock clock)
+    : factory_(factory), options_(line.host), registered_(registered), messages_(messages) {
+    record_.input = line.files[0];
+    record_.output = line.files[1];
+    record_.isDryRun = options_.dryRun != 0;
+    record_.clock = std::move(clock);
+}
+
+ExitCode Run::execute() {
+    ExitCode failure = ExitCode::done;
+    try {
+        doStages();
+    } catch (const Failure& e) {
+        base::log().progressEnd();
+        failure = e.code;
+        for (const string& text : e.texts)
+            base::log().log(base::logSystem, base::logError, text);
+    }
+    base::log().progressEnd();
+    record_.exitCode = judged(failure);
+    try {
+        if (!options_.reportFile.empty())
+            attempt(ExitCode::output, options_.reportFile, [&] { writeReport(); });
+    } catch (const Failure& e) {
+        base::log().log(base::logSystem, base::logError, e.texts[0]);
+        record_.exitCode = judged(failure == ExitCode::done ? e.code : failure);
+    }
+    if (record_.exitCode == ExitCode::done || record_.exitCode == ExitCode::strict)
+        printSummary();
+    return record_.exitCode;
+}
+
+void Run::doStages() {
+    record_.clock.begin("import");
+    checkInput(record_.input);
+    attempt(ExitCode::input, record_.input, [&] { prepareImport(); });
+    attempt(ExitCode::noExport, record_.output, [&] { prepareExport(); });
+    checkOutput(record_.output);
+    tellProgress(10, "Reading", record_.input);
+    attempt(ExitCode::input, record_.input, [&] { importScene(); });
+    applySceneOptions();
+    record_.unexported = findUnexported(factory_);
+
+    record_.clock.begin("export");
+    tellProgress(50, record_.isDryRun ? "Checking" : "Writing", record_.output);
+    if (record_.isDryRun)
+        attempt(ExitCode::input, record_.input, [&] { record_.scene = checkScene(factory_); });
+    else
+        attempt(ExitCode::noExport, record_.output, [&] { exportScene(); });
+
+    record_.clock.begin("report");
+    if (!record_.isDryRun)
+        attempt(ExitCode::output, record_.output,
+                [&] { record_.written = readOutput(record_.output); });
+}
+
+/// Finds the importer and its settings.
+void Run::prepareImport() {
+    const CrashGuard guard(record_.input);
+    AttribMap& settings = record_.settings.importer;
+    if (!factory_.getImporterParameters(record_.input, settings))
+        throw Failure(ExitCode::input,
+                      base::format("{}: no plugin reads files of this kind, expected {}.",
+                                   record_.input, listOf(factory_.getImporterExtensions())));
+    base::vector<string> errors;
+    scene::applyOptions(registered_, "importer", settings, errors);
+}
+
+/// Finds the exporter and its settings.
+void Run::prepareExport() {
+    AttribMap& settings = record_.settings.exporter;
+    string reason = "no plugin writes files of this kind";
+    try {
+        if (factory_.getExporterParameters(record_.output, settings))
+            reason.clear();
+    } catch (const base::exception& e) { // a path without an extension
+        reason = e.what();
+    }
+    if (!reason.empty())
+        throw Failure(ExitCode::noExport,
+                      base::format("{}: {}, expected {}.", record_.output, reason,
+                                   listOf(factory_.getExporterExtensions())));
+    base::vector<string> errors;
+    scene::applyOptions(registered_, "exporter", settings, errors);
+}
+
+void Run::importScene() {
+    const CrashGuard guard(record_.input);
+    if (!factory_.load(factory_, record_.input, record_.settings.importer))
+        throw Failure(ExitCode::input,
+                      record_.input + ": could not be read, expected a file of the kind that its "
+                                      "extension tells. The messages above are the reader's.");
+}
+
+void Run::applySceneOptions() {
+    using Schema = scene::scene_schema;
+    const base::ref<base::IPlugin> scene = factory_.firstOfType(Schema::n_kind);
+    if (!scene)
+        return;
+    const auto* upAxis =
+        dynamic_cast<const base::CmdLineValue<base::u8>*>(registered_.find("-upAxis"));
+    if (upAxis && upAxis->seen)
+        write(*scene, Schema::n_upAxis) = upAxis->values[0];
+    write(record_.settings.scene, Schema::n_upAxis) = read(*scene, Schema::n_upAxis);
+}
+
+void Run::exportScene() {
+    if (!factory_.save(factory_, record_.output, record_.settings.exporter))
+        throw Failure(ExitCode::noExport,
+                      record_.output + ": there is nothing to write, expected a scene with a root "
+                                       "node in the input.");
+    if (messages_.tellFailedFile())
+        throw Failure(ExitCode::output,
+                      record_.output + ": not all files could be written, expected room and leave "
+                                       "to write them. The messages above tell which.");
+}
+
+/// The exit code with what the log received taken into account.
+ExitCode Run::judged(ExitCode failure) const {
+    if (failure != ExitCode::done)
+        return failure;
+    return options_.strict && !messages_.all().empty() ? ExitCode::strict : ExitCode::done;
+}
+
+void Run::writeReport() {
+    record_.clock.end();
+    writeFile(options_.reportFile, reportText(record_, messages_.all(), registered_));
+}
+
+void Run::printSummary() const {
+    if (!options_.quiet)
+        print(stdout, summaryLine(record_) + "\n");
+}
+
+/// The extensions of a list, with a dot in front of each.
+string Run::listOf(const string& extensions) const {
+    string list;
+    for (base::string_view entry : base::split(extensions, ';')) {
+        entry = base::trimmed(entry.substr(0, entry.find('|')));
+        if (!entry.empty())
+            list.append(list.empty() ? "." : ", .").append(entry);
+    }
+    return list.empty()
+               ? "a plugin for it in " + (options_.pluginFolder.empty() ? base::fs::moduleFolder()
+                                                                        : options_.pluginFolder)
+               : list;
+}
+
+} // namespace host

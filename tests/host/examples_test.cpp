@@ -1,0 +1,65 @@
+// The examples that the README shows do what it says of them.
+#include "program.h"
+
+#include "support/gltf_reader.h"
+
+namespace host_test {
+namespace {
+
+using ExamplesTest = ProgramTest;
+
+/// The positions of the only primitive of a file.
+std::vector<double> positionsOf(const std::string& path) {
+    const auto file = test_support::GltfFile::read(path);
+    const test_support::Primitive primitive = file.primitive(0, 0);
+    EXPECT_FALSE(primitive.compressed);
+    return primitive.attributes.at("POSITION").values;
+}
+
+TEST_F(ExamplesTest, HostWritesItsTriangle) {
+    const std::string plugins = std::filesystem::path(SCENE_EXPORT).parent_path();
+    const std::string output = path("@/triangle.gltf");
+    EXPECT_EQ(runProgram(MINIMAL_HOST, {plugins, output}).exitCode, 0);
+    EXPECT_EQ(positionsOf(output), (std::vector<double>{0, 0, 0, 1, 0, 0, 0, 1, 0}));
+    EXPECT_EQ(runProgram(MINIMAL_HOST, {plugins, path("@/none/triangle.gltf")}).exitCode, 4);
+    EXPECT_EQ(runProgram(MINIMAL_HOST, {plugins, path("@/triangle.x")}).exitCode, 3);
+}
+
+TEST_F(ExamplesTest, ImporterReadsTriangles) {
+    // A folder with this importer and the exporter.
+    namespace fs = std::filesystem;
+    fs::create_directory(path("@/plugins"));
+    for (const fs::path plugin : {MINIMAL_IMPORTER, SCENE_GLTF})
+        fs::create_symlink(plugin, path("@/plugins") / plugin.filename());
+    file("@/plugins/importers.txt", "TriangleImporter\nGLTFImporter\n");
+    file("@/two.tri", "0 0 0  1 0 0  0 1 0\n2 0 -1.5  3 0 0  2 1 0\n7 8");
+
+    const Outcome outcome =
+        runReal({"--plugins", "@/plugins", "-exportCompress", "false", "@/two.tri", "@/two.glb"});
+    EXPECT_EQ(outcome.exitCode, 0) << outcome.err;
+    EXPECT_EQ(outcome.err, "");
+    EXPECT_NE(outcome.out.find(", 1 mesh, 2 triangles, "), std::string::npos) << outcome.out;
+    EXPECT_EQ(positionsOf(path("@/two.glb")),
+              (std::vector<double>{0, 0, 0, 1, 0, 0, 0, 1, 0, 2, 0, -1.5, 3, 0, 0, 2, 1, 0}));
+}
+
+TEST_F(ExamplesTest, TextsShowTheExamples) {
+    for (const char* shown : {"README.md", "docs/writing_plugins.md"}) {
+        const std::filesystem::path source = SOURCE_FOLDER;
+        const std::string text = readFile(source / shown);
+        std::size_t blocks = 0;
+        // Each listing stands behind a line that names its file.
+        const std::string mark = "\n<!-- listing: ";
+        for (std::size_t at = text.find(mark); at != std::string::npos; at = text.find(mark, at)) {
+            at += mark.size();
+            const std::string name = text.substr(at, text.find(' ', at) - at);
+            const std::string listing = " -->\n```cpp\n" + readFile(source / name) + "```\n";
+            EXPECT_EQ(text.substr(at + name.size(), listing.size()), listing) << shown << name;
+            ++blocks;
+        }
+        EXPECT_EQ(blocks, 1u) << shown;
+    }
+}
+
+} // namespace
+} // namespace host_test
