@@ -189,14 +189,14 @@ public:
     }
 
     /// The elements become copies of [first, last), which must not lie in this vector.
-    template <class It>
+    template <std::forward_iterator It>
     void assign(It first, It last) {
         clear();
         append(first, last);
     }
 
     /// Appends [first, last), which must not lie in this vector.
-    template <class It>
+    template <std::forward_iterator It>
     void append(It first, It last) {
         const auto count = static_cast<size_type>(std::distance(first, last));
         if (count == 0)
