@@ -327,6 +327,7 @@ public:
         float fallOffAngle = 3.1415927f; ///< radians
         float fallOffExponent = 0;
     };
+    MaterialCommon() { type = Type::common; }
     ~MaterialCommon() override;
 };
 

@@ -130,14 +130,17 @@ Views convertColors(const IPlugin& mesh, std::size_t vertexCount) {
     using scene::meshColorSet_schema;
     Views views;
     const u32 setCount = getListCount(mesh, mesh_schema::n_colorSets);
+    // Meshes may share a set, and the conversion of another one replaces its array.
+    const base::Attribute* list = mesh.findAttribute(mesh_schema::n_colorSets);
+    const bool ownsSets = list && list->asArray() && mayBorrow(mesh, mesh_schema::n_colorSets);
     for (u32 i = 0; i < setCount; ++i) {
         const AttribMap* set = findListItem(mesh, mesh_schema::n_colorSets, i);
         if (!set)
             continue;
         if (set->findAttribute(meshColorSet_schema::n_RGB)) {
             VertexArray rgb = readArray<vec3f>(*set, meshColorSet_schema::n_RGB, vertexCount, mesh);
-            // Meshes may share a set, and the conversion of another one replaces its array.
-            rgb.setShared();
+            if (!ownsSets)
+                rgb.setShared();
             if (rgb)
                 views.push_back(makeVertexView(rgb, mesh));
         } else if (set->findAttribute(meshColorSet_schema::n_RGBA) ||

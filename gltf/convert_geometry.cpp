@@ -183,14 +183,19 @@ u64 MeshIndices::findOutOfRange() const {
 
 namespace {
 
-/// True if an index of one of the primitives leads past the vertices.
+/// True if an index leads past the vertices.
 bool hasIndexOutOfRange(const GLTF::Mesh& gltfMesh, const MeshIndices& indices) {
     // The bounds are there already. As floats they order like the indices, but for equality.
     const float vertexCount = static_cast<float>(indices.vertexCount());
-    const bool maybe =
-        std::ranges::any_of(gltfMesh.primitives, [&](const ref<GLTF::Primitive>& primitive) {
-            return primitive->indices && primitive->indices->max[0] >= vertexCount;
-        });
+    u64 seen = 0;
+    bool maybe = false;
+    for (const ref<GLTF::Primitive>& primitive : gltfMesh.primitives) {
+        if (!primitive->indices)
+            continue;
+        seen += static_cast<u64>(primitive->indices->count);
+        maybe |= primitive->indices->max[0] >= vertexCount;
+    }
+    maybe |= seen < indices.count();
     return maybe && indices.findOutOfRange() != indices.count();
 }
 

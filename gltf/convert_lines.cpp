@@ -141,7 +141,6 @@ GLTF::Material* GLTFScenePlugin::getEdgeMaterial(const scene::ILines& lines) {
     if (!edgeMaterial_) {
         const vec3f color = readEdgeColor(lines);
         edgeMaterial_ = base::makeRef<GLTF::MaterialPBR>();
-        edgeMaterial_->metallicRoughness = base::makeRef<GLTF::MaterialPBR::MetallicRoughness>();
         edgeMaterial_->metallicRoughness->baseColorFactor = {color.x, color.y, color.z, 1};
     }
     return edgeMaterial_.get();

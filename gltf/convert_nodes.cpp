@@ -38,26 +38,10 @@ mat43 worldFromNode(const TreePosition& position) {
 }
 
 /// True if the node at `position` or one above it is animated.
-bool isAnimated(const TreePosition* position) {
+bool isPlacedByAnimation(const TreePosition* position) {
     while (position && !position->isAnimated)
         position = position->parent;
     return position != nullptr;
-}
-
-/// The transform of `node` below `parent`, null at the root.
-mat43 parentFromNode(const scene::INode& node, const TreePosition* parent) {
-    mat43 transform;
-    if (!parent || read(node, scene::node_schema::n_inheritsTransform)) {
-        node.getTransform(transform, nullptr);
-        return transform;
-    }
-    if (isAnimated(parent) && !node.hasTransformChannels())
-        logNode(node, base::logWarning,
-                "The node does not inherit the transform of its parent, which is animated: it is "
-                "placed for the present time only!");
-    const mat43 parentWorld = worldFromNode(*parent);
-    node.getTransform(transform, &parentWorld);
-    return transform;
 }
 
 vec3f negated(const vec3f& v) {
@@ -122,9 +106,43 @@ bool hasAssignment(const IPlugin& lines) {
 
 } // namespace
 
+/// The transform of `node` below `parent`, null at the root.
+mat43 GLTFScenePlugin::findParentFromNode(const scene::INode& node, const TreePosition* parent) {
+    constexpr u32 animatedParent = scene::INode::faultParent << 1;
+    const bool isFree = parent && !read(node, scene::node_schema::n_inheritsTransform);
+    mat43 transform;
+    u32 faults = 0;
+    if (isFree) {
+        const mat43 parentWorld = worldFromNode(*parent);
+        faults = node.getTransform(transform, &parentWorld);
+        if (isPlacedByAnimation(parent) && !node.hasTransformChannels())
+            faults |= animatedParent;
+    } else {
+        faults = node.getTransform(transform, nullptr);
+    }
+    if (faults == 0)
+        return transform;
+
+    u32& known = transformFaults_[&node];
+    const u32 added = faults & ~known;
+    known |= faults;
+    if ((added & scene::INode::faultNotFinite) != 0)
+        logNode(node, base::logWarning,
+                "The transform has values that are not finite, they are ignored.");
+    if ((added & scene::INode::faultParent) != 0)
+        logNode(node, base::logWarning,
+                "The transform can't be freed of its parent's, the parent is unknown or its "
+                "transform has no inverse.");
+    if ((added & animatedParent) != 0)
+        logNode(node, base::logWarning,
+                "The node does not inherit the transform of its parent, which is animated: it is "
+                "placed for the present time only!");
+    return transform;
+}
+
 ref<GLTF::Node> GLTFScenePlugin::convertRoot(const scene::INode& root, u8 upAxis) {
     const TreePosition position{root, nullptr, 1, root.hasTransformChannels(),
-                                parentFromNode(root, nullptr)};
+                                findParentFromNode(root, nullptr)};
     const auto gltfRoot = base::makeRef<GLTF::Node>();
     // Always a matrix: the turn of the axes can't be a part of animated values.
     gltfRoot->transform = makeMatrix(turnedUp(position.parentFromNode, upAxis));
@@ -166,7 +184,7 @@ void GLTFScenePlugin::convertChildNode(GLTF::Node& gltfNode, IPlugin& child,
     setName(*gltfChild, *node);
 
     const TreePosition position{*node, &parent, parent.level + 1, node->hasTransformChannels(),
-                                parentFromNode(*node, &parent)};
+                                findParentFromNode(*node, &parent)};
     convertTransform(position, *gltfChild);
     gltfNode.children.push_back(gltfChild);
     convertNode(*gltfChild, position);

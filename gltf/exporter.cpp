@@ -139,6 +139,7 @@ void GLTFScenePlugin::clearTables() {
     morphBases_.clear();
     walkedNodes_.clear();
     nodeCount_ = 0;
+    transformFaults_.clear();
     edgeMaterial_.reset();
 }
 

@@ -68,6 +68,7 @@ private:
     base::ref<GLTF::Asset> makeAsset(const base::ref<GLTF::Node>& gltfRoot) const;
     void clearTables();
 
+    base::mat43 findParentFromNode(const scene::INode& node, const TreePosition* parent);
     void convertChildNode(GLTF::Node& gltfNode, base::IPlugin& child, const TreePosition& parent);
     bool mayPlace(const scene::INode& child, const TreePosition& parent);
     void convertObject(GLTF::Node& gltfNode, base::IPlugin& child);
@@ -83,6 +84,8 @@ private:
     /// The nodes with child nodes that the walk has met; true while it is below them.
     base::hash_map<const scene::INode*, bool> walkedNodes_;
     base::u32 nodeCount_ = 0; ///< nodes placed in the tree
+    /// What was logged of the transforms of nodes, each of which may be met at several places.
+    base::hash_map<const scene::INode*, base::u32> transformFaults_;
     base::ref<GLTF::MaterialPBR> edgeMaterial_;
 };
 

@@ -27,6 +27,7 @@ struct JointSource {
     base::vector<u32> counts;
     base::vector<u32> joints;
     VertexArray weights;
+    bool hasJoints, hasWeights; ///< such an array is there, if only an empty one
 };
 
 base::vector<u32> readIntegers(const base::AttribMap& set, base::name_id name) {
@@ -48,13 +49,13 @@ bool isComplete(const JointSource& source, std::size_t vertexCount, const base::
         return false;
     }
     const u64 sum = std::accumulate(source.counts.begin(), source.counts.end(), u64(0));
-    if (source.joints.empty() || source.joints.size() < sum) {
+    if (!source.hasJoints || source.joints.size() < sum) {
         log.log(base::logScene, base::logError,
                 "{}| Missing joint indices in vertex weights at index {}!", mesh.getName(),
                 setIndex);
         return false;
     }
-    if (!source.weights || source.weights.count() < sum) {
+    if (!source.hasWeights || source.weights.count() < sum) {
         log.log(base::logScene, base::logError, "{}| Missing weights in joint weights at index {}!",
                 mesh.getName(), setIndex);
         return false;
@@ -105,7 +106,9 @@ JointChannels convertJoints(const base::IPlugin& mesh, std::size_t vertexCount) 
         return {};
     JointSource source{readIntegers(*set, meshJointsSet_schema::n_jointCounts),
                        readIntegers(*set, meshJointsSet_schema::n_indices),
-                       findVertexArray<float>(*set, meshJointsSet_schema::n_weights)};
+                       findVertexArray<float>(*set, meshJointsSet_schema::n_weights),
+                       set->findAttribute(meshJointsSet_schema::n_indices) != nullptr,
+                       set->findAttribute(meshJointsSet_schema::n_weights) != nullptr};
     if (!isComplete(source, vertexCount, mesh))
         return {};
     makeFinite(source.weights, mesh, "weights");

@@ -18,7 +18,6 @@ public:
     PlyPluginDesc() {
         type = base::nameServer().id("GLTFImporter");
         author = "Scene export team";
-        info = "Writes glTF 2.0.";
     }
 
     base::IPlugin* create(base::PluginFactory& factory, u32 id) override {
@@ -42,7 +41,7 @@ void registerPlugin(base::PluginFactory& factory) {
     scene::register_viewport_schema(factory);
     scene::register_importer_schema();
     scene::register_exporter_schema();
-    factory.registerDesc(base::makeRef<PlyPluginDesc>());
+    factory.registerDesc(base::ref<base::IPluginDesc>(new (std::nothrow) PlyPluginDesc));
 }
 
 } // namespace gltf

@@ -7,7 +7,9 @@ namespace {
 constexpr string_view blanks = " \t\r\n";
 
 void appendPadded(string& out, int value, std::size_t digits) {
-    const string text = std::to_string(value);
+    if (value < 0)
+        out += '-';
+    const string text = std::to_string(std::abs(value));
     if (text.size() < digits)
         out.append(digits - text.size(), '0');
     out += text;

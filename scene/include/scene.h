@@ -91,15 +91,15 @@ public:
     void setTransform(const base::mat43& transform) override;
     bool hasTransformChannels() const override;
 
+    /// What a transform does without.
+    enum TransformFault : base::u8 {
+        faultNotFinite = 1, ///< numbers that are not finite, defaults stand for them
+        faultParent = 2,    ///< its parent's inverse: that is unknown or there is none
+    };
     /// As `getTransform` for a caller that knows where it met the node: `parentWorld` is the
     /// world transform of that parent, null if there is none. Only a node that does not inherit
-    /// looks at it.
-    void getTransform(base::mat43& transform, const base::mat43* parentWorld) const;
-
-private:
-    enum Warning : base::u8 { warnedNotFinite = 1, warnedParent = 2 };
-    void warnOnce(Warning warning, base::string_view text) const;
-    mutable base::u8 warnings_ = 0;
+    /// looks at it. Returns the faults as bits.
+    base::u32 getTransform(base::mat43& transform, const base::mat43* parentWorld) const;
 };
 
 class SCENE_API IGeometry : public base::IPlugin, public IBounded, public geometry_schema {
@@ -159,7 +159,8 @@ SCENE_CLASS(IViewportWindow, base::IPlugin, viewportWindow)
 
 /// Turns the bytes of a buffer into typed vectors: each output attribute that the adapter has
 /// becomes a view of the chosen bytes, without a copy. The buffer is kept alive as long as the
-/// views are.
+/// views are. Who changes the buffer's data tells the adapter by `changed` or `afterLoad` before
+/// the outputs are read again; exports call `afterLoad`.
 class SCENE_API IBufferAdapter : public base::IPlugin,
                                  public bufferAdapter_schema,
                                  public base::PluginCallback {

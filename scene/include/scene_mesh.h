@@ -35,8 +35,6 @@ base::u32 getPrimitiveIndexStart(const base::AttribMap& mesh, base::u32 index, b
 /// Entries of the primitive; without a stored count the whole index array.
 base::u32 getPrimitiveIndexCount(const base::AttribMap& mesh, base::u32 index, bool triangulated);
 
-/// The box of the finite points among `points`; empty if there is none.
-base::box3f computeBounds(const base::vector<base::vec3f>& points);
 /// The object's own "bounds" if it is stored, finite and not empty (a stored box wins, even if
 /// it is out of date), else the box of its finite "positions" or "points".
 base::box3f getGeometryBounds(const base::AttribMap& geometry);

@@ -112,27 +112,18 @@ base::IPlugin* INode::findChild(base::u32 index) const {
     return children && index < children->size() ? (*children)[index].get() : nullptr;
 }
 
-void INode::warnOnce(Warning warning, base::string_view text) const {
-    if ((warnings_ & warning) != 0)
-        return;
-    warnings_ = static_cast<base::u8>(warnings_ | warning);
-    base::log().log(base::logScene, base::logWarning, "gltf |{}| {}", getName(), text);
-}
-
-void INode::getTransform(base::mat43& transform, const base::mat43* parentWorld) const {
+base::u32 INode::getTransform(base::mat43& transform, const base::mat43* parentWorld) const {
     bool repaired = false;
     transform = composeTransform(*this, repaired);
-    if (repaired)
-        warnOnce(warnedNotFinite,
-                 "The transform has values that are not finite, they are ignored.");
+    const base::u32 faults = repaired ? faultNotFinite : 0;
     if (read(*this, n_inheritsTransform))
-        return;
+        return faults;
     base::mat43 undo, freed;
-    if (parentWorld && invert(*parentWorld, undo) && fitsFloats(freed = multiply(undo, transform)))
-        transform = freed;
-    else
-        warnOnce(warnedParent, "The transform can't be freed of its parent's, the parent is "
-                               "unknown or its transform has no inverse.");
+    if (!parentWorld || !invert(*parentWorld, undo) ||
+        !fitsFloats(freed = multiply(undo, transform)))
+        return faults | faultParent;
+    transform = freed;
+    return faults;
 }
 
 void INode::getTransform(base::mat43& transform) const {

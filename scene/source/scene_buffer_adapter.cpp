@@ -14,16 +14,35 @@ struct ByteRange {
     std::size_t length;
 };
 
-/// Turns the output, if the adapter has it, into a view of `bytes`; whole elements alone.
+/// Turns the output, if the adapter has it, into a view of `bytes`; whole elements alone. Without
+/// bytes a former view becomes empty, since what it viewed may be gone.
 template <class T>
-void view(base::AttribMap& adapter, const SchemaAttribute<Array<T>>& output, ByteRange bytes) {
+void view(base::AttribMap& adapter, const SchemaAttribute<Array<T>>& output,
+          const ByteRange* bytes) {
     if (!find(adapter, output))
         return;
-    base::Attribute* attribute = adapter.findAttribute(output);
-    const auto* first = reinterpret_cast<const T*>(bytes.begin);
-    static_cast<Array<T>*>(attribute->data())->setView(first, first + bytes.length / sizeof(T));
+    auto& elements = *static_cast<Array<T>*>(adapter.findAttribute(output)->data());
+    if (bytes) {
+        const auto* first = reinterpret_cast<const T*>(bytes->begin);
+        elements.setView(first, first + bytes->length / sizeof(T));
+    } else if (elements.isView()) {
+        elements.clear();
+    } else {
+        return;
+    }
     // Tells the readers of the output.
     adapter.findAttributeMutable(output);
+}
+
+void viewAll(base::AttribMap& adapter, const ByteRange* bytes) {
+    using Schema = bufferAdapter_schema;
+    view(adapter, Schema::n_outputUint8, bytes);
+    view(adapter, Schema::n_outputUint16, bytes);
+    view(adapter, Schema::n_outputUint32, bytes);
+    view(adapter, Schema::n_outputFloat, bytes);
+    view(adapter, Schema::n_outputFloat2, bytes);
+    view(adapter, Schema::n_outputFloat3, bytes);
+    view(adapter, Schema::n_outputFloat4, bytes);
 }
 
 } // namespace
@@ -46,16 +65,17 @@ void IBufferAdapter::changed(base::u32, const base::AttribPath& path) {
 
 void IBufferAdapter::refresh() {
     base::IPlugin* buffer = findObject(*this, n_inputBuffer);
-    if (!buffer) {
+    const auto* data = buffer ? find(*buffer, buffer_schema::n_data) : nullptr;
+    if (!buffer)
         base::log().log(base::logScene, base::logWarning,
                         "bufferAdapter |{}| Missing `inputBuffer` attribute!", getName());
-        return;
-    }
-    const auto* data = find(*buffer, buffer_schema::n_data);
-    if (!data) {
+    else if (!data)
         base::log().log(base::logScene, base::logWarning,
                         "bufferAdapter |{}| Missing `data` attribute in {}!", getName(),
                         buffer->getName());
+    if (!data) {
+        viewAll(*this, nullptr);
+        viewedBuffer_ = nullptr;
         return;
     }
     const std::size_t size = data->size();
@@ -63,14 +83,7 @@ void IBufferAdapter::refresh() {
     const std::size_t length = std::min<std::size_t>(read(*this, n_inputLength), size - offset);
     // The length counts from the start of the data, whatever the offset.
     const ByteRange bytes{data->data() + offset, length > offset ? length - offset : 0};
-
-    view(*this, n_outputUint8, bytes);
-    view(*this, n_outputUint16, bytes);
-    view(*this, n_outputUint32, bytes);
-    view(*this, n_outputFloat, bytes);
-    view(*this, n_outputFloat2, bytes);
-    view(*this, n_outputFloat3, bytes);
-    view(*this, n_outputFloat4, bytes);
+    viewAll(*this, &bytes);
     viewedBuffer_ = base::ref<base::IPlugin>(buffer);
 }
 

@@ -157,6 +157,7 @@ bool isFinite(const auto& p) {
     return (p.x - p.x) + (p.y - p.y) + (p.z - p.z) == 0;
 }
 
+/// The box of the finite points; empty if there is none.
 template <class Point>
 box3f boundsOf(const base::vector<Point>& points) {
     box3f box;
@@ -170,10 +171,6 @@ box3f boundsOf(const base::vector<Point>& points) {
 }
 
 } // namespace
-
-box3f computeBounds(const base::vector<vec3f>& points) {
-    return boundsOf(points);
-}
 
 box3f getGeometryBounds(const AttribMap& geometry) {
     const box3f* stored = find(geometry, geometry_schema::n_bounds);

@@ -273,7 +273,12 @@ namespace {
 
 /// Divides `v` by its length, which is returned; a vector without length stays.
 float normalize(vec3f& v) {
-    const float length = std::sqrt(dot(v, v));
+    float length = std::sqrt(dot(v, v));
+    if (!(length <= std::numeric_limits<float>::max())) { // the squares are beyond floats
+        const double x = v.x, y = v.y, z = v.z;
+        length = static_cast<float>(
+            std::min<double>(std::sqrt(x * x + y * y + z * z), std::numeric_limits<float>::max()));
+    }
     if (length > zeroLength)
         v = {v.x / length, v.y / length, v.z / length};
     return length;

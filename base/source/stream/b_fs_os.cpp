@@ -73,7 +73,8 @@ FileHandle openFile(const string& path, u32 mode) {
     FileHandle file(uninterrupted([&] { return ::open(path.c_str(), openFlags(mode), 0666); }));
     if (file.get() < 0) {
         const int code = errno;
-        if (access == openRead && (code == ENOENT || code == ENOTDIR))
+        const bool expectsFile = (mode & openRead) != 0 && (mode & openCreate) == 0;
+        if (expectsFile && (code == ENOENT || code == ENOTDIR))
             throw file_not_found(path, "b_fs", function, __LINE__);
         fail(code);
     }
