@@ -1,6 +1,7 @@
 #include "host/document_counts.h"
 
 #include "host/document_stream.h"
+#include "host/paths.h"
 
 #include "b_exception.h"
 #include "b_format.h"
@@ -242,14 +243,12 @@ void addResource(const Resource& resource, const string& folder, vector<WrittenF
     const string path = folder + resource.uri;
     if (std::ranges::find(files, path, &WrittenFile::path) != files.end())
         return;
-    try {
-        Stream stream;
-        base::fs::master().open(stream, path, base::fs::openRead | base::fs::openShareRead);
-        files.push_back({path, stream.size()});
-        bytes += files.cend()[-1].bytes;
-    } catch (const base::exception&) {
-        // The exporter has told that it could not write it.
-    }
+    std::error_code error;
+    const u64 fileBytes = std::filesystem::file_size(systemPath(path), error);
+    if (error) // the exporter has told that it could not write it
+        return;
+    files.push_back({path, fileBytes});
+    bytes += fileBytes;
 }
 
 constexpr u32 containerMagic = 0x46546C67; // "glTF"
@@ -286,6 +285,8 @@ u64 Output::totalBytes() const {
 
 Output readOutput(const string& path) {
     Output output;
+    if (isSpecialFile(path))
+        return output;
     Stream stream;
     base::fs::master().open(stream, path, base::fs::openRead | base::fs::openShareRead);
     const u64 fileBytes = stream.size();

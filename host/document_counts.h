@@ -30,14 +30,15 @@ struct DocumentCounts {
 
 /// What an export has written.
 struct Output {
-    base::vector<WrittenFile> files;        ///< the main file, then those that it refers to
+    /// The main file, then those that it refers to. None if the main file is a pipe or a device.
+    base::vector<WrittenFile> files;
     std::optional<DocumentCounts> document; ///< none if the main file is no glTF document
 
     base::u64 totalBytes() const;
 };
 
-/// Reads the main file `path` and looks for the files that it refers to. Throws
-/// `base::exception` if it can't be read or is broken.
+/// Reads the main file `path` and looks for the files that it refers to; only regular files are
+/// opened. Throws `base::exception` if it can't be read or is broken.
 Output readOutput(const base::string& path);
 
 } // namespace host

@@ -4,8 +4,7 @@
 #include "host/run.h"
 #include "host/version.h"
 
-#include "b_string_convert.h"
-#include "stream/b_fs.h"
+#include "b_format.h"
 
 #include <cerrno>
 #include <cstring>
@@ -15,9 +14,8 @@ namespace host {
 namespace {
 
 void loadPlugins(scene::SceneFactory& factory, const base::string& folder) {
-    if (!folder.empty() && !base::fs::master().exists(folder))
-        throw Failure(ExitCode::usage,
-                      folder + ": does not exist, expected a folder with plugins.");
+    if (!folder.empty())
+        checkPluginFolder(folder);
     factory.loadPlugins(folder);
 }
 
@@ -32,11 +30,7 @@ base::string formatsText(const scene::SceneFactory& factory) {
                         list(factory.getExporterExtensions()));
 }
 
-ExitCode runCommand(const CommandLine& line) {
-    StageClock clock;
-    clock.begin("discovery");
-    checkFilesDiffer(line);
-    const Messages messages(line.host);
+ExitCode runLogged(const CommandLine& line, const Messages& messages, StageClock clock) {
     const auto factory = base::makeRef<scene::SceneFactory>("scene");
     loadPlugins(*factory, line.host.pluginFolder);
     base::CmdLineOptions registered;
@@ -50,16 +44,35 @@ ExitCode runCommand(const CommandLine& line) {
         return ExitCode::done;
     }
     parseOptions(line, registered);
+    checkFilesDiffer(line, findSideFile(line, registered));
     return Run(*factory, line, registered, messages, std::move(clock)).execute();
+}
+
+/// Tells of an output that failed. Returns the exit code of the run, which would end with `code`.
+ExitCode withFailedOutput(ExitCode code, const base::string& text) {
+    printError(text);
+    return code == ExitCode::done || code == ExitCode::strict ? ExitCode::output : code;
+}
+
+ExitCode runCommand(const CommandLine& line) {
+    StageClock clock;
+    clock.begin("discovery");
+    checkFilesDiffer(line, "");
+    Messages messages(line.host);
+    const ExitCode code = runLogged(line, messages, std::move(clock));
+    return messages.close()
+               ? code
+               : withFailedOutput(code, line.host.logFile + ": the log could not be written "
+                                                            "whole, expected room for it.");
 }
 
 /// `code`, unless what was printed did not get through.
 ExitCode flushed(ExitCode code) {
     if (std::fflush(stdout) == 0 && std::ferror(stdout) == 0)
         return code;
-    printError(base::format("standard output: {}, expected that it takes the text.",
-                            std::strerror(errno)));
-    return code == ExitCode::done || code == ExitCode::strict ? ExitCode::output : code;
+    return withFailedOutput(code, base::format("standard output: {}, expected that it takes the "
+                                               "text.",
+                                               std::strerror(errno)));
 }
 
 ExitCode runGuarded(std::span<const char* const> arguments) {

@@ -1,14 +1,16 @@
 #include "host/messages.h"
 
 #include "host/exit_code.h"
+#include "host/paths.h"
 #include "host/printing.h"
 
 #include "b_string_convert.h"
+#include "stream/b_fs.h"
 
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
-#include <unistd.h>
+#include <utility>
 
 namespace host {
 
@@ -18,12 +20,13 @@ using base::vector;
 
 namespace {
 
-/// With these an exporter begins the message that it could not write a file; it goes on then and
-/// reports success.
+/// With these begin the messages that a file could not be written. Exporters go on then and report
+/// success; closing a stream never throws.
 constexpr string_view failedFileTexts[] = {
     "Unable to write the GLTF file!",
     "Couldn't write the image to external file!",
     "Couldn't write the binary buffer to external file!",
+    "Unhandled exception while closing '",
 };
 
 /// Exporters remove their temporary files once more at the end, to be sure.
@@ -73,14 +76,26 @@ Failure logFileFailure(const string& path, const char* reason) {
 } // namespace
 
 string objectOf(string_view message) {
+    // These tell of no object.
+    if (message.starts_with("map attribute|") || message.starts_with("plugin factory"))
+        return {};
     const std::size_t first = message.find('|');
     if (first == string_view::npos)
         return {};
-    const string_view rest = message.substr(first + 1);
-    if (rest.starts_with(' ')) // "object| text", unless it is a mark within the text
-        return first > 0 && message[first - 1] != ' ' ? string(message.substr(0, first)) : string();
-    const std::size_t end = rest.find("| ");
-    return end == string_view::npos ? string() : string(rest.substr(0, end));
+    const string_view head = message.substr(0, first);
+    string_view rest = message.substr(first + 1);
+    const auto isMarkInText = [](string_view before) { return before.ends_with(' '); };
+    if (!rest.starts_with(' ')) { // "subsystem |object| text"
+        const std::size_t end = rest.find("| ");
+        return end == string_view::npos ? string() : string(rest.substr(0, end));
+    }
+    if (isMarkInText(head))
+        return {};
+    rest.remove_prefix(1);
+    const std::size_t second = rest.find("| ");
+    if (second == string_view::npos || isMarkInText(rest.substr(0, second)))
+        return string(head); // "object| text"
+    return string(rest.substr(0, second));
 }
 
 class Messages::Record final : public base::ICustomLog {
@@ -107,39 +122,50 @@ Messages::Messages(const HostOptions& options) : record_(base::makeRef<Record>()
         base::log().addOutput(output);
 }
 
-Messages::~Messages() {
-    for (const base::ref<base::ICustomLog>& output : std::as_const(outputs_))
-        base::log().removeOutput(output.get());
-    outputs_.clear();
-    if (logFile_)
-        std::fclose(logFile_);
-}
-
-void Messages::attachLogFile(const string& path) {
+void Messages::attachLogFile(const string& givenPath) {
+    checkOutput(givenPath);
+    const string path = base::fs::master().resolve(givenPath);
     constexpr string_view htmlExtension = ".html";
     if (path.ends_with(htmlExtension)) {
-        outputs_.push_back(
-            base::makeRef<base::HtmlLog>(path.substr(0, path.size() - htmlExtension.size())));
-        if (access(path.c_str(), W_OK) != 0)
-            throw logFileFailure(path, std::strerror(errno));
+        htmlLog_ = base::makeRef<base::HtmlLog>(path.substr(0, path.size() - htmlExtension.size()));
+        if (htmlLog_->hasFailed())
+            throw logFileFailure(givenPath, std::strerror(errno));
+        outputs_.push_back(htmlLog_);
     } else {
         logFile_ = std::fopen(path.c_str(), "we");
         if (!logFile_)
-            throw logFileFailure(path, std::strerror(errno));
+            throw logFileFailure(givenPath, std::strerror(errno));
         outputs_.push_back(base::makeRef<base::StdLog>(path, logFile_));
     }
     outputs_.cend()[-1]->setLevelLimit(base::logDebug); // the log's own limit decides
+}
+
+Messages::~Messages() {
+    close();
+}
+
+bool Messages::close() {
+    for (const base::ref<base::ICustomLog>& output : std::as_const(outputs_))
+        base::log().removeOutput(output.get());
+    outputs_.clear();
+    bool isWhole = !htmlLog_ || !htmlLog_->hasFailed();
+    if (std::FILE* file = std::exchange(logFile_, nullptr)) {
+        isWhole = std::ferror(file) == 0;
+        isWhole &= std::fclose(file) == 0;
+    }
+    return isWhole;
 }
 
 const vector<Message>& Messages::all() const {
     return record_->all;
 }
 
-bool Messages::tellFailedFile() const {
-    return std::ranges::any_of(record_->all, [](const Message& message) {
+std::size_t Messages::countFailedFiles() const {
+    const auto tells = [](const Message& message) {
         return std::ranges::any_of(
             failedFileTexts, [&](string_view begin) { return message.text.starts_with(begin); });
-    });
+    };
+    return static_cast<std::size_t>(std::ranges::count_if(record_->all, tells));
 }
 
 } // namespace host

@@ -17,7 +17,8 @@ struct Message {
     base::string text;
 };
 
-/// The object of a message of the form "subsystem |object| text" or "object| text".
+/// The object of a message of the form "subsystem |object| text", "subsystem| object| text" or
+/// "object| text"; empty for others.
 base::string objectOf(base::string_view message);
 
 /// Attaches the outputs to the log while it lives. Messages of level 1 to 3 are kept, except the
@@ -31,16 +32,19 @@ public:
     Messages& operator=(const Messages&) = delete;
 
     const base::vector<Message>& all() const;
-    /// Whether a message tells that an output file could not be written.
-    bool tellFailedFile() const;
+    /// Number of messages that tell that an output file could not be written.
+    std::size_t countFailedFiles() const;
+    /// Detaches the outputs and closes the log file. False if that could not be written whole.
+    bool close();
 
 private:
     class Record;
-    void attachLogFile(const base::string& path);
+    void attachLogFile(const base::string& givenPath);
 
     base::ref<Record> record_;
     base::vector<base::ref<base::ICustomLog>> outputs_;
     std::FILE* logFile_ = nullptr; ///< of the plain text form
+    base::ref<base::HtmlLog> htmlLog_;
 };
 
 } // namespace host

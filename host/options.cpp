@@ -155,7 +155,7 @@ void parseOption(const GivenOption& given, const CmdLineOptions& registered,
     }
 }
 
-/// What can be told of values only by those who use them: words of settings, the axis.
+/// What can be told of values only by those who use them: words of settings.
 void checkValues(const CmdLineOptions& registered, vector<string>& errors) {
     vector<string> found;
     for (const char* group : {"importer", "exporter"}) {
@@ -164,12 +164,6 @@ void checkValues(const CmdLineOptions& registered, vector<string>& errors) {
     }
     for (const string& error : std::as_const(found))
         errors.push_back(string(base::trimmed(error)));
-
-    const auto* upAxis =
-        dynamic_cast<const base::CmdLineValue<base::u8>*>(registered.find("-upAxis"));
-    if (upAxis && upAxis->seen && upAxis->values[0] > 2)
-        errors.push_back(base::format("option '-upAxis': expected 0 (X), 1 (Y) or 2 (Z), got {}.",
-                                      upAxis->values[0]));
 }
 
 void appendOption(string& text, string_view line, string_view help) {

@@ -3,9 +3,8 @@
 #include "host/exit_code.h"
 
 #include "b_format.h"
+#include "b_string_convert.h"
 #include "stream/b_fs.h"
-
-#include <filesystem>
 
 namespace host {
 
@@ -14,11 +13,6 @@ using base::string;
 namespace {
 
 namespace stdfs = std::filesystem;
-
-/// The path as the operating system sees it.
-stdfs::path systemPath(const string& path) {
-    return base::fs::master().resolve(path);
-}
 
 bool isSameFile(const stdfs::path& a, const stdfs::path& b) {
     std::error_code error;
@@ -31,7 +25,17 @@ bool isSameFile(const stdfs::path& a, const stdfs::path& b) {
 
 } // namespace
 
-void checkFilesDiffer(const CommandLine& line) {
+stdfs::path systemPath(const string& path) {
+    return base::fs::master().resolve(path);
+}
+
+bool isSpecialFile(const string& path) {
+    std::error_code error;
+    const stdfs::file_status status = stdfs::status(systemPath(path), error);
+    return stdfs::exists(status) && !stdfs::is_regular_file(status);
+}
+
+void checkFilesDiffer(const CommandLine& line, const string& sideFile) {
     struct NamedFile {
         const char* role;
         string path;
@@ -41,6 +45,7 @@ void checkFilesDiffer(const CommandLine& line) {
         files = {{"INPUT", line.files[0]}, {"OUTPUT", line.files[1]}};
     files.push_back({"the log", line.host.logFile});
     files.push_back({"the report", line.host.reportFile});
+    files.push_back({"the buffer of OUTPUT", sideFile});
 
     for (const NamedFile* a = files.cbegin(); a != files.cend(); ++a) {
         for (const NamedFile* b = a + 1; b != files.cend(); ++b) {
@@ -53,24 +58,23 @@ void checkFilesDiffer(const CommandLine& line) {
     }
 }
 
+string findSideFile(const CommandLine& line, const base::CmdLineOptions& registered) {
+    const auto* embedded =
+        dynamic_cast<const base::CmdLineValue<bool>*>(registered.find("-exportEmbedded"));
+    const string& output = line.files[1];
+    if (!embedded || !embedded->seen || embedded->values[0] ||
+        base::toLower(base::fs::extension(output)) != "gltf")
+        return {};
+    // The only buffer of a document has the number 0.
+    return base::fs::folder(output) + base::fs::stem(output) + "0.bin";
+}
+
 void checkInput(const string& path) {
-    std::error_code error;
-    const stdfs::file_status status = stdfs::status(systemPath(path), error);
-    // Opening a pipe or a device could wait for ever.
-    if (stdfs::exists(status) && !stdfs::is_regular_file(status))
+    if (isSpecialFile(path))
         throw Failure(ExitCode::input,
                       base::format("{}: is no regular file, expected a model file.", path));
-    try {
-        base::Stream stream;
-        base::fs::master().open(stream, path, base::fs::openRead | base::fs::openShareRead);
-    } catch (const base::api_exception& e) {
-        throw Failure(ExitCode::input,
-                      base::format("{}: {}: {}, expected a file that can be read.", path, e.what(),
-                                   std::generic_category().message(e.code())));
-    } catch (const base::exception& e) {
-        throw Failure(ExitCode::input,
-                      base::format("{}: {} Expected a file that can be read.", path, e.what()));
-    }
+    base::Stream stream;
+    base::fs::master().open(stream, path, base::fs::openRead | base::fs::openShareRead);
 }
 
 void checkOutput(const string& path) {
@@ -83,6 +87,15 @@ void checkOutput(const string& path) {
     if (!stdfs::is_directory(folder, error))
         throw Failure(ExitCode::output,
                       base::format("{}: its folder does not exist, expected one that does.", path));
+}
+
+void checkPluginFolder(const string& path) {
+    std::error_code error;
+    const stdfs::file_status status = stdfs::status(systemPath(path), error);
+    if (!stdfs::is_directory(status))
+        throw Failure(ExitCode::usage,
+                      base::format("{}: {}, expected a folder with plugins.", path,
+                                   stdfs::exists(status) ? "is no folder" : "does not exist"));
 }
 
 } // namespace host

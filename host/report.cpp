@@ -53,6 +53,8 @@ string dryRunLine(const RunRecord& record) {
 }
 
 string writtenLine(const RunRecord& record) {
+    if (record.written.files.empty())
+        return record.output + ": written, not counted as it is no regular file";
     string line = record.output + ": " + counted(record.written.files.size(), "file") + ", " +
                   counted(record.written.totalBytes(), "byte");
     if (!record.written.document)

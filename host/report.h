@@ -24,7 +24,7 @@ struct RunRecord {
     bool isDryRun = false;
     ExitCode exitCode = ExitCode::done;
     Settings settings;
-    Output written;    ///< without files if the run ended before
+    Output written;    ///< without files also if the run ended before
     SceneCounts scene; ///< of a dry run
     base::vector<ObjectName> unexported;
     StageClock clock;

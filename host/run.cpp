@@ -17,20 +17,25 @@ using base::string;
 
 namespace {
 
-/// Calls `work`; what it throws becomes a `Failure` with `code` that tells of `path`.
+/// Calls `work`; what it throws becomes a `Failure` with `code` that tells what failed with `path`
+/// and what was expected of it.
 template <class Work>
-void attempt(ExitCode code, const string& path, const Work& work) {
+void attempt(ExitCode code, const string& path, const string& expected, const Work& work) {
+    string reason;
     try {
         work();
+        return;
     } catch (const Failure&) {
         throw;
     } catch (const std::bad_alloc&) {
-        throw Failure(code, path + ": there is not enough memory for it.");
+        reason = "there is not enough memory for it";
     } catch (const std::exception& e) {
-        throw Failure(code, path + ": " + e.what());
+        reason = e.what();
     } catch (...) {
-        throw Failure(code, path + ": an unknown exception was thrown.");
+        reason = "an unknown exception was thrown";
     }
+    reason.resize(reason.find_last_not_of(".! \n") + 1); // the sentence goes on
+    throw Failure(code, base::format("{}: {}, expected {}.", path, reason, expected));
 }
 
 /// Tells how far the run is, for the bar.
@@ -72,7 +77,8 @@ ExitCode Run::execute() {
     record_.exitCode = judged(failure);
     try {
         if (!options_.reportFile.empty())
-            attempt(ExitCode::output, options_.reportFile, [&] { writeReport(); });
+            attempt(ExitCode::output, options_.reportFile, "a file that can be written",
+                    [&] { writeReport(); });
     } catch (const Failure& e) {
         base::log().log(base::logSystem, base::logError, e.texts[0]);
         record_.exitCode = judged(failure == ExitCode::done ? e.code : failure);
@@ -84,25 +90,30 @@ ExitCode Run::execute() {
 
 void Run::doStages() {
     record_.clock.begin("import");
-    checkInput(record_.input);
-    attempt(ExitCode::input, record_.input, [&] { prepareImport(); });
-    attempt(ExitCode::noExport, record_.output, [&] { prepareExport(); });
+    attempt(ExitCode::input, record_.input, "a file that can be read",
+            [&] { checkInput(record_.input); });
+    attempt(ExitCode::input, record_.input, listOf(factory_.getImporterExtensions()),
+            [&] { prepareImport(); });
+    attempt(ExitCode::noExport, record_.output, listOf(factory_.getExporterExtensions()),
+            [&] { prepareExport(); });
     checkOutput(record_.output);
     tellProgress(10, "Reading", record_.input);
-    attempt(ExitCode::input, record_.input, [&] { importScene(); });
+    attempt(ExitCode::input, record_.input, "a model that can be read", [&] { importScene(); });
     applySceneOptions();
     record_.unexported = findUnexported(factory_);
 
     record_.clock.begin("export");
     tellProgress(50, record_.isDryRun ? "Checking" : "Writing", record_.output);
     if (record_.isDryRun)
-        attempt(ExitCode::input, record_.input, [&] { record_.scene = checkScene(factory_); });
+        attempt(ExitCode::input, record_.input, "a scene that can be checked",
+                [&] { record_.scene = checkScene(factory_, messages_); });
     else
-        attempt(ExitCode::noExport, record_.output, [&] { exportScene(); });
+        attempt(ExitCode::noExport, record_.output, "a scene that can be exported",
+                [&] { exportScene(); });
 
     record_.clock.begin("report");
     if (!record_.isDryRun)
-        attempt(ExitCode::output, record_.output,
+        attempt(ExitCode::output, record_.output, "a whole file that can be read back",
                 [&] { record_.written = readOutput(record_.output); });
 }
 
@@ -111,9 +122,7 @@ void Run::prepareImport() {
     const CrashGuard guard(record_.input);
     AttribMap& settings = record_.settings.importer;
     if (!factory_.getImporterParameters(record_.input, settings))
-        throw Failure(ExitCode::input,
-                      base::format("{}: no plugin reads files of this kind, expected {}.",
-                                   record_.input, listOf(factory_.getImporterExtensions())));
+        throw base::exception("no plugin reads files of this kind");
     base::vector<string> errors;
     scene::applyOptions(registered_, "importer", settings, errors);
 }
@@ -121,17 +130,8 @@ void Run::prepareImport() {
 /// Finds the exporter and its settings.
 void Run::prepareExport() {
     AttribMap& settings = record_.settings.exporter;
-    string reason = "no plugin writes files of this kind";
-    try {
-        if (factory_.getExporterParameters(record_.output, settings))
-            reason.clear();
-    } catch (const base::exception& e) { // a path without an extension
-        reason = e.what();
-    }
-    if (!reason.empty())
-        throw Failure(ExitCode::noExport,
-                      base::format("{}: {}, expected {}.", record_.output, reason,
-                                   listOf(factory_.getExporterExtensions())));
+    if (!factory_.getExporterParameters(record_.output, settings))
+        throw base::exception("no plugin writes files of this kind");
     base::vector<string> errors;
     scene::applyOptions(registered_, "exporter", settings, errors);
 }
@@ -161,7 +161,7 @@ void Run::exportScene() {
         throw Failure(ExitCode::noExport,
                       record_.output + ": there is nothing to write, expected a scene with a root "
                                        "node in the input.");
-    if (messages_.tellFailedFile())
+    if (messages_.countFailedFiles() != 0)
         throw Failure(ExitCode::output,
                       record_.output + ": not all files could be written, expected room and leave "
                                        "to write them. The messages above tell which.");
@@ -176,7 +176,10 @@ ExitCode Run::judged(ExitCode failure) const {
 
 void Run::writeReport() {
     record_.clock.end();
+    const std::size_t failedBefore = messages_.countFailedFiles();
     writeFile(options_.reportFile, reportText(record_, messages_.all(), registered_));
+    if (messages_.countFailedFiles() != failedBefore)
+        throw base::exception("could not be closed");
 }
 
 void Run::printSummary() const {

@@ -1,5 +1,7 @@
 #pragma once
 
+#include "host/messages.h"
+
 #include "b_factory.h"
 
 namespace host {
@@ -23,7 +25,7 @@ struct SceneCounts {
 };
 
 /// Brings each mesh into the form in which it is exported, changing it in place, checks it and
-/// counts. Faults are logged.
-SceneCounts checkScene(base::PluginFactory& scene);
+/// counts. Logs the faults that an export would log; a mesh of which `messages` got one is faulty.
+SceneCounts checkScene(base::PluginFactory& scene, const Messages& messages);
 
 } // namespace host

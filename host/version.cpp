@@ -7,6 +7,7 @@
 #include <rapidjson/rapidjson.h>
 
 #include <algorithm>
+#include <dlfcn.h>
 #include <filesystem>
 #include <gnu/libc-version.h>
 #include <link.h>
@@ -34,6 +35,13 @@ base::vector<string> loadedLibraries() {
     return paths;
 }
 
+/// The version of the library for polygons, which is opened only when one needs it.
+string geosVersion() {
+    void* library = dlopen("libgeos_c.so.1", RTLD_NOW | RTLD_LOCAL);
+    void* version = library ? dlsym(library, "GEOSversion") : nullptr;
+    return version ? reinterpret_cast<const char* (*)()>(version)() : "not installed";
+}
+
 } // namespace
 
 string versionText(const scene::SceneFactory& factory) {
@@ -42,12 +50,14 @@ string versionText(const scene::SceneFactory& factory) {
         if (dynamic_cast<const scene::IScenePluginDesc*>(desc.get()))
             text += base::format("  {}{}{}\n", type, desc->info.empty() ? "" : ": ", desc->info);
     }
+    const string geos = geosVersion();
     text += "\nLibraries:\n";
     const base::vector<string> libraries = loadedLibraries();
     for (const string& path : libraries)
         text += base::format("  {}\n", path);
-    text += base::format("\nC library {}, RapidJSON {}, compiled with {}\n", gnu_get_libc_version(),
-                         RAPIDJSON_VERSION_STRING, "g++ " __VERSION__);
+    text +=
+        base::format("\nC library {}, GEOS {}, RapidJSON {}, compiled with {}\n",
+                     gnu_get_libc_version(), geos, RAPIDJSON_VERSION_STRING, "g++ " __VERSION__);
     return text;
 }
 

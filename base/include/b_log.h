@@ -156,8 +156,8 @@ private:
     bool terminal_;
 };
 
-/// A table in `name` + ".html"; an older file is kept as `name` + "-old.html". What can't be
-/// opened is dealt with as in `StdLog`. Once finished, it drops further messages.
+/// A table in `name` + ".html"; an older regular file is kept as `name` + "-old.html". What can't
+/// be opened is dealt with as in `StdLog`. Once finished, it drops further messages.
 class BASE1_API HtmlLog : public ICustomLog {
 public:
     explicit HtmlLog(const string& name);
@@ -166,9 +166,12 @@ public:
     void progress(u32 percent, string_view text) override;
     void progressEnd() override;
     void finish() override;
+    /// True if the file could not be opened or, as known once finished, not be written whole.
+    bool hasFailed() const noexcept { return failed_; }
 
 private:
     std::FILE* file_; ///< null if it could not be opened, and once finished
+    bool failed_ = false;
 };
 
 /// The process-wide log. Outputs that are still attached at the end of the process are removed

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <array>
 #include <ctime>
+#include <sys/stat.h>
 #include <unistd.h>
 
 namespace base {
@@ -69,8 +70,11 @@ std::FILE* openForWriting(const string& path, const char* mode) {
     return file;
 }
 
+/// Moves a regular file away; folders and devices are not ours to move.
 void backUp(const string& path, const string& backupPath) {
-    if (access(path.c_str(), F_OK) == 0 && std::rename(path.c_str(), backupPath.c_str()) != 0)
+    struct stat status {};
+    if (stat(path.c_str(), &status) == 0 && S_ISREG(status.st_mode) &&
+        std::rename(path.c_str(), backupPath.c_str()) != 0)
         std::fputs("Failed to backup the old log file!\n", stderr);
 }
 
@@ -140,7 +144,8 @@ HtmlLog::HtmlLog(const string& name) {
     backUp(path, name + "-old.html");
     // Appending keeps an old log that could not be moved away.
     file_ = openForWriting(path, "ae");
-    if (!file_)
+    failed_ = !file_;
+    if (failed_)
         return;
     std::fseek(file_, 0, SEEK_END);
     if (std::ftell(file_) == 0)
@@ -172,7 +177,8 @@ void HtmlLog::finish() {
     if (!file_)
         return;
     write(file_, "</table>\n</div><div>Terminated at " + timeText() + "</div>\n");
-    std::fclose(file_);
+    failed_ = std::ferror(file_) != 0;
+    failed_ |= std::fclose(file_) != 0;
     file_ = nullptr;
 }
 

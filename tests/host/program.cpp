@@ -2,6 +2,7 @@
 
 #include <fcntl.h>
 #include <fstream>
+#include <rapidjson/prettywriter.h>
 #include <sstream>
 #include <stdlib.h>
 #include <sys/wait.h>
@@ -25,8 +26,13 @@ std::string readFile(const fs::path& path) {
     return text.str();
 }
 
-void writeFile(const fs::path& path, const std::string& content) {
-    std::ofstream(path, std::ios::binary) << content;
+void expectJson(const rapidjson::Value& value, const char* expected) {
+    rapidjson::Document document;
+    document.Parse(expected);
+    rapidjson::StringBuffer text;
+    rapidjson::PrettyWriter<rapidjson::StringBuffer> writer(text);
+    value.Accept(writer);
+    EXPECT_TRUE(document == value) << text.GetString();
 }
 
 Outcome runProgram(const std::string& program, const std::vector<std::string>& arguments,
@@ -72,7 +78,7 @@ std::string ProgramTest::path(std::string name) const {
 }
 
 std::string ProgramTest::file(const std::string& name, const std::string& content) {
-    writeFile(path(name), content);
+    std::ofstream(path(name), std::ios::binary) << content;
     return path(name);
 }
 
@@ -91,6 +97,13 @@ Outcome ProgramTest::runScript(const std::string& script, std::vector<std::strin
     file("@/a.script", script);
     options.insert(options.end(), {"@/a.script", "@/a.out"});
     return run(std::move(options));
+}
+
+rapidjson::Document ProgramTest::report() const {
+    rapidjson::Document document;
+    document.Parse(readFile(path("@/report.json")).c_str());
+    EXPECT_FALSE(document.HasParseError());
+    return document;
 }
 
 } // namespace host_test

@@ -2,6 +2,7 @@
 
 #include <filesystem>
 #include <gtest/gtest.h>
+#include <rapidjson/document.h>
 #include <string>
 #include <vector>
 
@@ -18,7 +19,8 @@ Outcome runProgram(const std::string& program, const std::vector<std::string>& a
                    const std::string& standardOutput = "");
 
 std::string readFile(const std::filesystem::path& path);
-void writeFile(const std::filesystem::path& path, const std::string& content);
+/// Checks a value by its text; the order of members does not count.
+void expectJson(const rapidjson::Value& value, const char* expected);
 
 /// The program under test in a folder of its own. In arguments and file names "@" stands for
 /// that folder.
@@ -36,6 +38,8 @@ protected:
     /// Exports a script and returns what came of it, with the output as "@/a.out".
     Outcome runScript(const std::string& script, std::vector<std::string> options = {});
     std::string path(std::string name) const;
+    /// The report "@/report.json".
+    rapidjson::Document report() const;
     bool exists(const std::string& name) const { return std::filesystem::exists(path(name)); }
 
     std::filesystem::path folder_;
