@@ -476,8 +476,9 @@ public:
 
 // Compression
 
-/// glTF attribute names and their Draco attribute ids. Written in the order of the chained hash
-/// table that other writers of these files use, so that files stay comparable.
+/// glTF attribute names and their Draco attribute ids. They are written in the order of a chained
+/// hash table with FNV-1 keys and prime numbers of buckets, which is part of the files' form: files
+/// of the same scene compare byte by byte.
 class DracoAttributeIds {
 public:
     DracoAttributeIds();

@@ -7,7 +7,7 @@ PLUGIN_ENTRY base::i32 loadScenePlugin(base::PluginFactory& factory) {
     return 0;
 }
 
-/// What was registered stays with its factory.
+/// Nothing to do: the factory takes back what was registered with it.
 PLUGIN_ENTRY base::u32 unloadScenePlugin() {
     return 0;
 }

@@ -13,6 +13,7 @@ using base::u32;
 
 namespace {
 
+/// The names are those by which hosts know the exporter; nothing is imported.
 class PlyPluginDesc final : public scene::IScenePluginDesc {
 public:
     PlyPluginDesc() {

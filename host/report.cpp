@@ -22,54 +22,6 @@ using base::u64;
 
 namespace {
 
-// Summary
-
-string secondsText(double seconds) {
-    char text[32];
-    const auto end = std::to_chars(text, std::end(text), seconds, std::chars_format::fixed, 3).ptr;
-    return string(text, end);
-}
-
-string counted(u64 count, string_view what) {
-    return base::format("{} {}{}", count, what, count == 1 ? "" : "s");
-}
-
-bool readFlag(const base::AttribMap& settings, const scene::DefaultedAttribute<bool>& name) {
-    return scene::read(settings, name);
-}
-
-string dryRunLine(const RunRecord& record) {
-    using Schema = scene::sceneExporter_schema;
-    const base::AttribMap& settings = record.settings.exporter;
-    string line = record.output + ": would be written";
-    line += readFlag(settings, Schema::n_exportEmbedded) ? " with its resources inside"
-                                                         : " with resources in files beside it";
-    line += readFlag(settings, Schema::n_exportCompress) ? ", compressed" : ", not compressed";
-    line += "; the scene has " + counted(record.scene.nodes, "node") + ", ";
-    line += base::format("{} mesh{} ({} with faults), ", record.scene.meshes,
-                         record.scene.meshes == 1 ? "" : "es", record.scene.faultyMeshes);
-    line += counted(record.scene.triangles, "triangle") + ", ";
-    return line + counted(record.unexported.size(), "object") + " that can't be exported";
-}
-
-string writtenLine(const RunRecord& record) {
-    if (record.written.files.empty())
-        return record.output + ": written, not counted as it is no regular file";
-    string line = record.output + ": " + counted(record.written.files.size(), "file") + ", " +
-                  counted(record.written.totalBytes(), "byte");
-    if (!record.written.document)
-        return line;
-    const DocumentCounts& counts = *record.written.document;
-    line += ", " + counted(counts.nodes, "node");
-    line += base::format(", {} mesh{}", counts.meshes, counts.meshes == 1 ? "" : "es");
-    line += ", " + counted(counts.triangles, "triangle");
-    line += ", " + counted(counts.materials, "material");
-    line += ", " + counted(counts.images, "image");
-    return line + ", " + counted(counts.animations, "animation");
-}
-
-// Report
-
 using Writer = rapidjson::PrettyWriter<rapidjson::StringBuffer>;
 
 void writeText(Writer& writer, string_view text) {
@@ -218,11 +170,6 @@ void writeUnexported(Writer& writer, const base::vector<ObjectName>& objects) {
 }
 
 } // namespace
-
-string summaryLine(const RunRecord& record) {
-    const string line = record.isDryRun ? dryRunLine(record) : writtenLine(record);
-    return printable(line + ", " + secondsText(record.clock.totalSeconds()) + " s");
-}
 
 string reportText(const RunRecord& record, const base::vector<Message>& messages,
                   const base::CmdLineOptions& registered) {

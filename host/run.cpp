@@ -3,6 +3,8 @@
 #include "host/crash_guard.h"
 #include "host/paths.h"
 #include "host/printing.h"
+#include "host/report.h"
+#include "host/summary.h"
 
 #include "b_string_convert.h"
 #include "scene_schema.h"

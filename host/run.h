@@ -1,7 +1,8 @@
 #pragma once
 
+#include "host/messages.h"
 #include "host/options.h"
-#include "host/report.h"
+#include "host/run_record.h"
 
 #include "scene_factory.h"
 
