@@ -122,6 +122,8 @@ GeometryObjects importGeometry(const aiMesh& mesh, const GeometrySettings& setti
                                base::PluginFactory& factory, GeometryFaults& faults) {
     vector<vec3f> positions = readPositions(mesh, faults);
     MeshFaces faces = collectFaces(mesh, positions, settings.flip);
+    if (settings.meshes)
+        cutFaces(faces, positions, base::string(viewOf(mesh.mName)), !settings.triangulate);
     faults.degenerateFaces += faces.degenerateCount;
     faults.brokenFaces += faces.brokenCount;
 
@@ -131,8 +133,6 @@ GeometryObjects importGeometry(const aiMesh& mesh, const GeometrySettings& setti
         lines = importLines(mesh, settings, faces.lines, positions, factory, faults);
     if (settings.points && !faces.points.empty())
         points = importPoints(mesh, std::move(faces.points), positions, factory);
-    if (settings.meshes && settings.triangulate)
-        triangulateFaces(faces, positions, base::string(viewOf(mesh.mName)));
     if (settings.meshes && !faces.corners.empty()) {
         polygons = createObject(factory, scene::mesh_schema::n_kind, mesh);
         importPolygons(mesh, settings, std::move(faces), std::move(positions), *polygons, faults);

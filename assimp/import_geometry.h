@@ -36,11 +36,15 @@ using GeometryObjects = base::vector<base::ref<base::IPlugin>>;
 /// Makes the scene objects of one assimp mesh, which may hold faces of several kinds: at most one
 /// `mesh` (its polygons), one `lines` and one `points`. All carry the mesh's name.
 ///
-/// Polygons stay as they are in the file. A mesh whose faces share vertices keeps its numbering
+/// Polygons stay as they are in the file, but for those without area and those that can't be cut
+/// into triangles plainly, see `cutFaces`. A mesh whose faces share vertices keeps its numbering
 /// in `indices`, less what no face uses. One with vertices of its own for each corner, which is
-/// what most readers deliver, gets its equal positions welded: `positions` with
-/// `positionIndices`, and one element per corner in every other array; the step to a single index
-/// then finds the vertices that are equal in everything.
+/// what most readers deliver, gets equal elements of every array welded, each array with indices of
+/// its own (`positionIndices` and so on), or `indices` if there are positions alone; the step to a
+/// single index then finds the vertices that are equal in everything.
+///
+/// Either way these vertices make a manifold, see `separateFans`: copies of positions, or of
+/// vertices where these are shared, keep faces apart that merely touch.
 GeometryObjects importGeometry(const aiMesh& mesh, const GeometrySettings& settings,
                                base::PluginFactory& factory, GeometryFaults& faults);
 

@@ -1,6 +1,5 @@
 #include "assimp/import_nodes.h"
 
-#include "assimp/import_transform.h"
 #include "assimp/library_text.h"
 
 #include "scene_schema.h"
@@ -8,6 +7,8 @@
 
 #include <assimp/ColladaMetaData.h>
 #include <assimp/scene.h>
+
+#include <cmath>
 
 namespace assimp {
 
@@ -36,6 +37,16 @@ base::string nameOf(const aiNode& node) {
     return {};
 }
 
+/// The transform of a node relative to its parent; the identity where the file's is not finite.
+mat43 readTransform(const aiNode& node) {
+    const aiMatrix4x4& m = node.mTransformation;
+    const float* values = &m.a1;
+    for (int i = 0; i < 12; ++i)
+        if (!std::isfinite(values[i]))
+            return {};
+    return {{{m.a1, m.a2, m.a3}, {m.b1, m.b2, m.b3}, {m.c1, m.c2, m.c3}}, {m.a4, m.b4, m.c4}};
+}
+
 /// True for a helper node that stands for one factor of its child's transform.
 bool isTransformFactor(const aiNode& node) {
     return node.mNumChildren == 1 && node.mNumMeshes == 0 &&
@@ -48,7 +59,7 @@ base::ref<base::IPlugin> importNode(const aiNode& source, const mat43& transform
     base::ref<base::IPlugin> node = factory.create(node_schema::n_kind);
     if (base::string name = nameOf(source); !name.empty())
         write(*node, node_schema::n_name) = std::move(name);
-    writeTransform(*node, transform);
+    scene::storeTransform(*node, transform);
     if (source.mNumMeshes + source.mNumChildren == 0)
         return node;
     auto& children = write(*node, node_schema::n_children);

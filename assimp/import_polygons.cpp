@@ -1,6 +1,7 @@
 #include "assimp/import_polygons.h"
 
 #include "assimp/library_text.h"
+#include "assimp/manifold.h"
 #include "assimp/vertex_frames.h"
 #include "assimp/vertex_selection.h"
 #include "assimp/weld.h"
@@ -35,6 +36,22 @@ AttribMap& appendItem(AttribMap& mesh, const scene::SchemaAttribute<scene::Items
     return *item.release();
 }
 
+template <class T>
+vector<T> elementsAt(const vector<T>& elements, const vector<u32>& indices) {
+    vector<T> result;
+    result.reserve(indices.size());
+    for (const u32 i : indices)
+        result.push_back(elements[i]);
+    return result;
+}
+
+/// Indices of the corners in arrays that are not the positions.
+struct ChannelIndices {
+    AttribMap* owner;
+    const scene::SchemaAttribute<vector<u32>>* name;
+    vector<u32> indices;
+};
+
 /// Makes the `mesh` object of the polygons.
 class PolygonImport {
 public:
@@ -55,6 +72,8 @@ public:
             writeTextureCoordinates();
         if (settings_.colors)
             writeColors();
+        if (perCorner_)
+            separateVertices();
         writePositions();
         writePrimitive();
         if (settings_.multiIndex == Presence::never)
@@ -73,12 +92,31 @@ private:
         return result;
     }
 
+    /// Of arrays per corner, which share indices, only what differs stays; the indices are kept for
+    /// later. Arrays per position stay as they are.
+    template <class... Ts>
+    void weldCorners(AttribMap& owner, const scene::SchemaAttribute<vector<u32>>& indices,
+                     vector<Ts>&... arrays) {
+        if (!perCorner_)
+            return;
+        Welding welding = weld(arrays...);
+        ((arrays = elementsAt(arrays, welding.firsts)), ...);
+        channels_.push_back({&owner, &indices, std::move(welding.numbers)});
+    }
+
     void selectVertices();
+    void selectSharedVertices();
     void settlePositions();
     void writeNormalsAndTangents();
-    vector<vec4f> readTangents(const vector<normal>& normals);
+    vector<normal> makeNormals(const Surface& surface);
+    vector<vec4f> readTangents(const vector<normal>& normals, vector<normal>& bitangents);
+    void writeTangents(const Surface& surface, const vector<normal>& normals);
     void writeTextureCoordinates();
+    template <class T>
+    void writeTextureSet(const scene::SchemaAttribute<vector<T>>& name, AttribMap& set,
+                         const aiVector3D* coordinates);
     void writeColors();
+    void separateVertices();
     void writePositions();
     void writePrimitive();
 
@@ -93,80 +131,76 @@ private:
     bool perCorner_; ///< arrays but the positions have one element per corner, else per position
     VertexSelection selection_;   ///< what the elements of these arrays are read from
     vector<u32> positionIndices_; ///< of the corners
-    bool hasCornerChannels_ = false;
+    vector<ChannelIndices> channels_;
 };
 
-/// For arrays per corner the vertices of the corners; else all that faces use, in assimp's order,
-/// by which the corners are numbered anew.
+/// For arrays per corner the vertices of the corners; else all that faces use.
 void PolygonImport::selectVertices() {
-    if (perCorner_) {
+    if (perCorner_)
         selection_ = {std::move(faces_.corners), mesh_.mNumVertices};
-        return;
-    }
+    else
+        selectSharedVertices();
+}
 
-    vector<u32> numbers(mesh_.mNumVertices);
-    u32* numberOf = numbers.data();
-    for (const u32 corner : std::as_const(faces_.corners))
-        numberOf[corner] = 1;
+/// In assimp's order, by which the corners are numbered anew; then copies of vertices, see
+/// `separateFans`.
+void PolygonImport::selectSharedVertices() {
+    constexpr u32 unused = 0xffffffff;
+    positionIndices_ = faces_.corners;
+    vector<u32> table(separateFans(positionIndices_, mesh_.mNumVertices, faces_), unused);
+    u32* entries = table.data();
+    for (std::size_t c = 0; c < positionIndices_.size(); ++c)
+        entries[std::as_const(positionIndices_)[c]] = std::as_const(faces_.corners)[c];
     vector<u32> used;
-    used.reserve(mesh_.mNumVertices);
-    for (u32 v = 0; v < mesh_.mNumVertices; ++v)
-        if (numberOf[v] != 0) {
-            numberOf[v] = static_cast<u32>(used.size());
-            used.push_back(v);
+    used.reserve(table.size());
+    for (u32& entry : table)
+        if (entry != unused) {
+            used.push_back(entry);
+            entry = static_cast<u32>(used.size()) - 1;
         }
-    for (u32& corner : faces_.corners)
-        corner = numberOf[corner];
-    positionIndices_ = std::move(faces_.corners);
+    for (u32& index : positionIndices_)
+        index = entries[index];
     selection_ = {std::move(used), mesh_.mNumVertices};
 }
 
 /// Makes the positions and position indices of the scene mesh.
 void PolygonImport::settlePositions() {
     if (!selection_.isWhole)
-        positions_ = selection_.read<vec3f>(std::as_const(positions_).data());
+        positions_ = elementsAt(positions_, selection_.vertices);
     if (!perCorner_)
         return;
     Welding welding = weld(positions_);
-    vector<vec3f> positions;
-    positions.reserve(welding.firsts.size());
-    for (const u32 first : std::as_const(welding.firsts))
-        positions.push_back(std::as_const(positions_)[first]);
-    positions_ = std::move(positions);
+    positions_ = elementsAt(positions_, welding.firsts);
     positionIndices_ = std::move(welding.numbers);
 }
 
 void PolygonImport::writeNormalsAndTangents() {
     if (!hasNormals())
         return;
-    hasCornerChannels_ = true;
     const Surface surface{positions_, positionIndices_, faces_.cornerCounts};
-    vector<normal> normals;
-    if (!computesNormals_) {
-        normals = readRepaired<normal>(mesh_.mNormals);
-        if (settings_.flip)
-            for (normal& n : normals)
-                n = {-n.x, -n.y, -n.z};
-        faults_.zeroNormals += repairNormals(normals, surface, perCorner_);
-    } else if (settings_.normalsMethod == scene::NormalsMethod::flat) {
-        normals = computeFlatNormals(surface);
-    } else {
-        normals = computeSmoothNormals(surface, settings_.normalsAngle);
-    }
-
-    if (computesTangents_) {
-        const vector<vec2f> uvs = selection_.read<vec2f>(mesh_.mTextureCoords[0]);
-        write(object_, mesh_schema::n_tangents) = computeTangents(surface, normals, uvs);
-    } else if (mesh_.mTangents && settings_.tangents != Presence::never) {
-        write(object_, mesh_schema::n_tangents) = readTangents(normals);
-    }
+    vector<normal> normals = makeNormals(surface);
+    if (computesTangents_ || (mesh_.mTangents && settings_.tangents != Presence::never))
+        writeTangents(surface, normals);
+    weldCorners(object_, mesh_schema::n_normalIndices, normals);
     write(object_, mesh_schema::n_normals) = std::move(normals);
 }
 
-/// The tangents of the file. Writes its bitangents, whose side decides the tangents' w.
-vector<vec4f> PolygonImport::readTangents(const vector<normal>& normals) {
+vector<normal> PolygonImport::makeNormals(const Surface& surface) {
+    if (computesNormals_)
+        return settings_.normalsMethod == scene::NormalsMethod::flat
+                   ? computeFlatNormals(surface)
+                   : computeSmoothNormals(surface, settings_.normalsAngle);
+    vector<normal> normals = readRepaired<normal>(mesh_.mNormals);
+    if (settings_.flip)
+        for (normal& n : normals)
+            n = {-n.x, -n.y, -n.z};
+    faults_.zeroNormals += repairNormals(normals, surface, perCorner_);
+    return normals;
+}
+/// The tangents of the file. Its bitangents decide on which side the tangents' w is.
+vector<vec4f> PolygonImport::readTangents(const vector<normal>& normals,
+                                          vector<normal>& bitangents) {
     const vector<vec3f> directions = readRepaired<vec3f>(mesh_.mTangents);
-    vector<normal> bitangents;
     if (mesh_.mBitangents)
         bitangents = readRepaired<normal>(mesh_.mBitangents);
     vector<vec4f> tangents;
@@ -180,9 +214,22 @@ vector<vec4f> PolygonImport::readTangents(const vector<normal>& normals) {
         tangents.push_back({t.x, t.y, t.z, side});
     }
     faults_.zeroTangents += repairTangents(tangents, normals);
-    if (!bitangents.empty())
-        write(object_, mesh_schema::n_bitangents) = std::move(bitangents);
     return tangents;
+}
+
+void PolygonImport::writeTangents(const Surface& surface, const vector<normal>& normals) {
+    vector<normal> bitangents;
+    vector<vec4f> tangents =
+        computesTangents_
+            ? computeTangents(surface, normals, selection_.read<vec2f>(mesh_.mTextureCoords[0]))
+            : readTangents(normals, bitangents);
+    if (bitangents.empty()) {
+        weldCorners(object_, mesh_schema::n_tangentIndices, tangents);
+    } else {
+        weldCorners(object_, mesh_schema::n_tangentIndices, tangents, bitangents);
+        write(object_, mesh_schema::n_bitangents) = std::move(bitangents);
+    }
+    write(object_, mesh_schema::n_tangents) = std::move(tangents);
 }
 
 /// Sets of two coordinates go to `UV`, of three to `UVW`, unless the third is always zero: it
@@ -192,7 +239,6 @@ void PolygonImport::writeTextureCoordinates() {
         const aiVector3D* coordinates = mesh_.mTextureCoords[i];
         if (!coordinates)
             continue;
-        hasCornerChannels_ = true;
         using Schema = scene::meshUVSet_schema;
         AttribMap& set = appendItem<Schema>(object_, mesh_schema::n_uvSets);
         if (mesh_.HasTextureCoordsName(i))
@@ -201,34 +247,75 @@ void PolygonImport::writeTextureCoordinates() {
             mesh_.mNumUVComponents[i] > 2 &&
             std::ranges::any_of(selection_.vertices, [&](u32 v) { return coordinates[v].z != 0; });
         if (isDeep)
-            write(set, Schema::n_UVW) = readRepaired<vec3f>(coordinates);
+            writeTextureSet(Schema::n_UVW, set, coordinates);
         else
-            write(set, Schema::n_UV) = readRepaired<vec2f>(coordinates);
+            writeTextureSet(Schema::n_UV, set, coordinates);
     }
+}
+
+template <class T>
+void PolygonImport::writeTextureSet(const scene::SchemaAttribute<vector<T>>& name, AttribMap& set,
+                                    const aiVector3D* coordinates) {
+    vector<T> elements = readRepaired<T>(coordinates);
+    weldCorners(set, scene::meshUVSet_schema::n_indices, elements);
+    write(set, name) = std::move(elements);
 }
 
 /// Every set has `RGB`; `RGBA` is added where some vertex is not opaque.
 void PolygonImport::writeColors() {
-    for (const aiColor4D* colors : mesh_.mColors) {
-        if (!colors)
+    for (const aiColor4D* source : mesh_.mColors) {
+        if (!source)
             continue;
-        hasCornerChannels_ = true;
         using Schema = scene::meshColorSet_schema;
         AttribMap& set = appendItem<Schema>(object_, mesh_schema::n_colorSets);
-        write(set, Schema::n_RGB) = readRepaired<vec3f>(colors);
-        if (std::ranges::any_of(selection_.vertices, [&](u32 v) { return colors[v].a != 1; }))
-            write(set, Schema::n_RGBA) = readRepaired<vec4f>(colors);
+        vector<vec4f> colors = readRepaired<vec4f>(source);
+        weldCorners(set, Schema::n_indices, colors);
+        vector<vec3f>& opaque = write(set, Schema::n_RGB);
+        opaque.reserve(colors.size());
+        for (const vec4f& c : std::as_const(colors))
+            opaque.push_back({c.x, c.y, c.z});
+        if (std::ranges::any_of(std::as_const(colors), [](const vec4f& c) { return c.w != 1; }))
+            write(set, Schema::n_RGBA) = std::move(colors);
     }
 }
 
-/// Positions with an index array of their own are needed only where another array has more
-/// elements.
+/// Makes corners of faces that merely touch different vertices, see `separateFans`, by copies of
+/// their positions.
+void PolygonImport::separateVertices() {
+    const auto cornerCount = static_cast<u32>(positionIndices_.size());
+    const auto positionCount = static_cast<u32>(positions_.size());
+    vector<u32> vertices;
+    u32 vertexCount = positionCount;
+    if (channels_.empty()) {
+        vertices = positionIndices_;
+    } else {
+        vector<const u32*> columns{positionIndices_.cbegin()};
+        for (const ChannelIndices& channel : std::as_const(channels_))
+            columns.push_back(channel.indices.data());
+        Welding welding = weldRows(columns, cornerCount);
+        vertices = std::move(welding.numbers);
+        vertexCount = static_cast<u32>(welding.firsts.size());
+    }
+    const u32 copiesEnd = separateFans(vertices, vertexCount, faces_);
+    positions_.resize(positionCount + copiesEnd - vertexCount);
+    vec3f* positions = positions_.data();
+    u32* indices = positionIndices_.data();
+    for (u32 c = 0; c < cornerCount; ++c) {
+        const u32 vertex = std::as_const(vertices)[c];
+        if (vertex < vertexCount)
+            continue;
+        const u32 copy = positionCount + vertex - vertexCount;
+        positions[copy] = positions[indices[c]];
+        indices[c] = copy;
+    }
+}
+
 void PolygonImport::writePositions() {
-    const bool isWelded = perCorner_ && positions_.size() < positionIndices_.size();
-    const auto& indices =
-        isWelded && hasCornerChannels_ ? mesh_schema::n_positionIndices : mesh_schema::n_indices;
     write(object_, mesh_schema::n_positions) = std::move(positions_);
-    write(object_, indices) = std::move(positionIndices_);
+    write(object_, channels_.empty() ? mesh_schema::n_indices : mesh_schema::n_positionIndices) =
+        std::move(positionIndices_);
+    for (ChannelIndices& channel : channels_)
+        write(*channel.owner, *channel.name) = std::move(channel.indices);
 }
 
 /// One primitive over all corners. A single count stands for equal ones.

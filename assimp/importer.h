@@ -23,11 +23,11 @@ public:
 /// | `importMeshes`, `importHair`, `importPoints` | polygons, line faces and points are read |
 /// | `importTriangulateMeshes` | polygons are cut into triangles |
 /// | `importColors`, `importTextureCoordinates` | the sets of meshes and lines are read |
-/// | `importMultiIndex` | never: meshes get one index per vertex at once; else where needed |
+/// | `importMultiIndex` | never: one index per vertex at once; else each array has its own |
 /// | `importNormals` | never; present: those of the file; always: computed where it has none |
 /// | `computeNormalsMethod`, `computeNormalsAngle` | how they are computed |
-/// | `importTangents`, `computeTangentsMethod` | the same; need normals, and texture coordinates to
-/// be computed | | `flipNormals` | faces are wound the other way, normals negated |
+/// | `importTangents` | the same; they need normals, and texture coordinates to be computed |
+/// | `flipNormals` | faces are wound the other way, normals negated |
 ///
 /// No format of the library's gives edges apart from line faces, surfaces or subdivision as such,
 /// or velocities, so `importEdges`, `importSurfaces`, `importTriangulateSurfaces`,

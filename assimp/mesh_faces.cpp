@@ -106,18 +106,78 @@ MeshFaces collectFaces(const aiMesh& mesh, const base::vector<vec3f>& positions,
     return faces;
 }
 
-void triangulateFaces(MeshFaces& faces, const base::vector<vec3f>& positions,
-                      const base::string& name) {
-    scene::PolygonTriangulator triangulator(positions, name);
-    base::vector<u32> triangles;
-    triangles.reserve(faces.corners.size());
+namespace {
+
+/// Takes polygons over into new lists, whole or in triangles.
+class FaceCutter {
+public:
+    FaceCutter(MeshFaces& faces, const base::vector<vec3f>& positions, const base::string& name)
+        : faces_(faces), triangulator_(positions, name), cornerOfVertex_(positions.size()) {
+        corners_.reserve(faces.corners.size());
+        counts_.reserve(faces.cornerCounts.size());
+    }
+
+    void add(std::span<const u32> polygon, bool keepsPolygons) {
+        cut_.clear();
+        const auto count = static_cast<u32>(polygon.size());
+        const bool isPlain = triangulator_.triangulatePolygon(polygon.data(), count, cut_);
+        if (count == 3 || (keepsPolygons && isPlain && cut_.size() == 3 * (count - 2)))
+            addWhole(polygon);
+        else
+            addTriangles();
+    }
+
+    void finish() {
+        faces_.corners = std::move(corners_);
+        faces_.cornerCounts = std::move(counts_);
+        if (faces_.corners.size() != triangles_.size())
+            faces_.triangles = std::move(triangles_);
+    }
+
+private:
+    void addWhole(std::span<const u32> polygon) {
+        u32* cornerOf = cornerOfVertex_.data();
+        for (const u32 vertex : polygon) {
+            cornerOf[vertex] = static_cast<u32>(corners_.size());
+            corners_.push_back(vertex);
+        }
+        counts_.push_back(static_cast<u16>(polygon.size()));
+        for (const u32 vertex : std::as_const(cut_))
+            triangles_.push_back(cornerOf[vertex]);
+    }
+
+    void addTriangles() {
+        if (cut_.empty())
+            ++faces_.degenerateCount;
+        for (std::size_t i = 0; i < cut_.size(); ++i)
+            triangles_.push_back(static_cast<u32>(corners_.size() + i));
+        corners_.append(cut_.cbegin(), cut_.cend());
+        counts_.resize(counts_.size() + cut_.size() / 3, u16(3));
+    }
+
+    MeshFaces& faces_;
+    scene::PolygonTriangulator triangulator_;
+    base::vector<u32> cornerOfVertex_; ///< in the polygon that was added last
+    base::vector<u32> cut_;
+    base::vector<u32> corners_;
+    base::vector<u16> counts_;
+    base::vector<u32> triangles_;
+};
+
+} // namespace
+
+void cutFaces(MeshFaces& faces, const base::vector<vec3f>& positions, const base::string& name,
+              bool keepsPolygons) {
+    const base::vector<u16>& counts = faces.cornerCounts;
+    if (std::ranges::all_of(counts, [](u16 count) { return count == 3; }))
+        return;
+    FaceCutter cutter(faces, positions, name);
     const u32* corners = faces.corners.cbegin();
-    for (const u16 count : std::as_const(faces.cornerCounts)) {
-        triangulator.triangulatePolygon(corners, count, triangles);
+    for (const u16 count : counts) {
+        cutter.add({corners, count}, keepsPolygons);
         corners += count;
     }
-    faces.corners = std::move(triangles);
-    faces.cornerCounts = base::vector<u16>(faces.corners.size() / 3, u16(3));
+    cutter.finish();
 }
 
 } // namespace assimp

@@ -13,8 +13,11 @@ struct MeshFaces {
     base::vector<base::u32> lines;        ///< two for each segment
     base::vector<base::u32> corners;      ///< of the polygons, one polygon after the other
     base::vector<base::u16> cornerCounts; ///< of each polygon
-    bool sharesVertices = false;          ///< some vertex is a corner of several polygons
-    base::u64 degenerateCount = 0;        ///< polygons left out, see `collectFaces`
+    /// Polygon after polygon the triangles that exporters cut it into, as numbers of corners, see
+    /// `cutFaces`; empty if all polygons are triangles.
+    base::vector<base::u32> triangles;
+    bool sharesVertices = false;   ///< some vertex is a corner of several polygons
+    base::u64 degenerateCount = 0; ///< polygons left out
     base::u64 brokenCount = 0;
 };
 
@@ -28,8 +31,11 @@ struct MeshFaces {
 /// than a count can tell.
 MeshFaces collectFaces(const aiMesh& mesh, const base::vector<base::vec3f>& positions, bool flip);
 
-/// Cuts the polygons into triangles as exporters would. `name` is the mesh's, for messages.
-void triangulateFaces(MeshFaces& faces, const base::vector<base::vec3f>& positions,
-                      const base::string& name);
+/// Cuts the polygons into triangles as exporters would. With `keepsPolygons` one stays in place,
+/// with its triangles in `triangles`, if these cover it: others come to fewer triangles, as some
+/// have no area, which may leave corners without any, or it takes a message to cut them, which one
+/// wants to read once. `name` is the mesh's, for messages.
+void cutFaces(MeshFaces& faces, const base::vector<base::vec3f>& positions,
+              const base::string& name, bool keepsPolygons);
 
 } // namespace assimp

@@ -23,8 +23,9 @@ public:
 
     /// Appends the triangles of the polygon with `cornerCount` corners, given as indices of
     /// positions, to `output`, three indices each, in the polygon's own winding. A polygon that
-    /// can't be cut in its plane adds nothing or what could be cut, with a message.
-    void triangulatePolygon(const base::u32* corners, base::u32 cornerCount,
+    /// can't be cut in its plane adds nothing or what could be cut, with a message. Returns
+    /// whether there was nothing to tell.
+    bool triangulatePolygon(const base::u32* corners, base::u32 cornerCount,
                             base::vector<base::u32>& output);
 
 private:

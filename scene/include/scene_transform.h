@@ -43,7 +43,12 @@ struct TransformParts {
 TransformParts decomposeTransform(const base::mat43& matrix);
 
 /// Makes `node` a placed one whose attributes compose to `matrix`: translation, quaternion, scale
-/// and shear, without pivots. Plain values take the place of whatever was stored, links too.
+/// and shear, without pivots. Plain values take the place of whatever was stored, links too;
+/// defaults are not stored. A mirrored matrix gets one negative scale, the one that needs the least
+/// rotation.
+///
+/// The translation is exact; each column of the product differs from that of the matrix by less
+/// than 5e-7 of its length, which is what a rotation in single precision leaves.
 void storeTransform(base::AttribMap& node, const base::mat43& matrix);
 
 } // namespace scene

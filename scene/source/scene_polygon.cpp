@@ -35,7 +35,7 @@ struct PolygonTriangulator::Impl {
 
     bool areValid(std::span<const u32> corners) const;
     void cutQuad(const u32* corners, base::vector<u32>& output) const;
-    void cutPolygon(std::span<const u32> corners, base::vector<u32>& output);
+    bool cutPolygon(std::span<const u32> corners, base::vector<u32>& output);
     bool cutByDelaunay();
     void failDelaunay(const base::string& reason);
     void cutByEars(double precision);
@@ -56,24 +56,24 @@ PolygonTriangulator::PolygonTriangulator(const base::vector<vec3f>& positions, b
 
 PolygonTriangulator::~PolygonTriangulator() = default;
 
-void PolygonTriangulator::triangulatePolygon(const u32* corners, u32 cornerCount,
+bool PolygonTriangulator::triangulatePolygon(const u32* corners, u32 cornerCount,
                                              base::vector<u32>& output) {
     if (cornerCount < 3)
-        return;
+        return true;
     if (cornerCount == 3) {
         output.append(corners, corners + 3);
-        return;
+        return true;
     }
     if (!impl_->areValid({corners, cornerCount})) {
         log().log(logScene, logError,
                   "triangulate |{}| Dropping invalid quad [{,10},{,10},{,10},{,10}]!", impl_->name,
                   corners[0], corners[1], corners[2], corners[3]);
-        return;
+        return false;
     }
-    if (cornerCount == 4)
-        impl_->cutQuad(corners, output);
-    else
-        impl_->cutPolygon({corners, cornerCount}, output);
+    if (cornerCount > 4)
+        return impl_->cutPolygon({corners, cornerCount}, output);
+    impl_->cutQuad(corners, output);
+    return true;
 }
 
 bool PolygonTriangulator::Impl::areValid(std::span<const u32> corners) const {
@@ -93,7 +93,7 @@ void PolygonTriangulator::Impl::cutQuad(const u32* corners, base::vector<u32>& o
     }
 }
 
-void PolygonTriangulator::Impl::cutPolygon(std::span<const u32> corners,
+bool PolygonTriangulator::Impl::cutPolygon(std::span<const u32> corners,
                                            base::vector<u32>& output) {
     const std::optional<PolygonPlane> plane = findPlane(positions, corners);
     if (!plane) {
@@ -101,13 +101,15 @@ void PolygonTriangulator::Impl::cutPolygon(std::span<const u32> corners,
                   "triangulate| {}| Can't calculate the polygon normal for plane projection, "
                   "skipping!",
                   name);
-        return;
+        return false;
     }
     projectPolygon(positions, corners, plane->normal, outline);
     triangles.clear();
-    if (!cutByDelaunay())
+    const bool isRegular = cutByDelaunay();
+    if (!isRegular)
         cutByEars(plane->precision);
     outputTriangles(corners.data(), output);
+    return isRegular;
 }
 
 /// False, with a message, if the outline is nothing for a Delaunay triangulation.

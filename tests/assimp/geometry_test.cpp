@@ -2,7 +2,6 @@
 #include "import_fixture.h"
 
 #include "scene_mesh.h"
-#include "scene_mesh_index.h"
 
 namespace {
 
@@ -13,12 +12,14 @@ using base::vec2f;
 using base::vec3f;
 using base::vec4f;
 using base::vector;
+using test_support::cornersOf;
 using test_support::Import;
 using test_support::LogCapture;
 using test_support::valuesOf;
 
 class Geometry : public Import {
 protected:
+    vector<vec3f> positions() { return valuesOf(mesh(), mesh_schema::n_positions); }
     vector<u16> vcounts() {
         const base::AttribMap* primitive = findListItem(mesh(), mesh_schema::n_primitives, 0);
         return primitive ? valuesOf(*primitive, meshPrimitive_schema::n_vcounts) : vector<u16>();
@@ -30,53 +31,29 @@ protected:
     }
 };
 
-const char* const cube = R"(
-v 0 0 0
-v 1 0 0
-v 1 1 0
-v 0 1 0
-v 0 0 1
-v 1 0 1
-v 1 1 1
-v 0 1 1
-vn 0 0 -1
-vn 0 0 1
-vn 0 -1 0
-vn 1 0 0
-vn 0 1 0
-vn -1 0 0
-f 1//1 4//1 3//1 2//1
-f 5//2 6//2 7//2 8//2
-f 1//3 2//3 6//3 5//3
-f 2//4 3//4 7//4 6//4
-f 3//5 4//5 8//5 7//5
-f 4//6 1//6 5//6 8//6
-)";
+const char* const cube = "v 0 0 0\nv 1 0 0\nv 1 1 0\nv 0 1 0\nv 0 0 1\nv 1 0 1\nv 1 1 1\nv 0 1 1\n"
+                         "vn 0 0 -1\nvn 0 0 1\nvn 0 -1 0\nvn 1 0 0\nvn 0 1 0\nvn -1 0 0\n"
+                         "f 1//1 4//1 3//1 2//1\nf 5//2 6//2 7//2 8//2\nf 1//3 2//3 6//3 5//3\n"
+                         "f 2//4 3//4 7//4 6//4\nf 3//5 4//5 8//5 7//5\nf 4//6 1//6 5//6 8//6\n";
 
-TEST_F(Geometry, CornersAreWeldedByPositionAndThenByValue) {
+TEST_F(Geometry, EachArrayIsWelded) {
     ASSERT_TRUE(load("cube.obj", cube));
     // Numbered by first appearance along the faces.
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_positions), (vector<vec3f>{{0, 0, 0},
-                                                                         {0, 1, 0},
-                                                                         {1, 1, 0},
-                                                                         {1, 0, 0},
-                                                                         {0, 0, 1},
-                                                                         {1, 0, 1},
-                                                                         {1, 1, 1},
-                                                                         {0, 1, 1}}));
+    EXPECT_EQ(positions().size(), 8u);
     EXPECT_EQ(
         valuesOf(mesh(), mesh_schema::n_positionIndices),
         (vector<u32>{0, 1, 2, 3, 4, 5, 6, 7, 0, 3, 5, 4, 3, 2, 6, 5, 2, 1, 7, 6, 1, 0, 4, 7}));
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_normals).size(), 24u);
+    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_normals).size(), 6u);
+    EXPECT_EQ(
+        valuesOf(mesh(), mesh_schema::n_normalIndices),
+        (vector<u32>{0, 0, 0, 0, 1, 1, 1, 1, 2, 2, 2, 2, 3, 3, 3, 3, 4, 4, 4, 4, 5, 5, 5, 5}));
     EXPECT_FALSE(find(mesh(), mesh_schema::n_indices));
     EXPECT_EQ(vcounts(), vector<u16>{4});
-    ASSERT_TRUE(convertToSingleIndex(mesh()));
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_positions).size(), 24u);
 
-    // Without data per corner the eight positions are the vertices.
+    // Positions alone need no indices of their own.
     set(Settings::n_importNormals, Presence::never);
     ASSERT_TRUE(load("cube.obj", cube));
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_positions).size(), 8u);
+    EXPECT_EQ(positions().size(), 8u);
     EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_indices).size(), 24u);
     EXPECT_FALSE(find(mesh(), mesh_schema::n_positionIndices));
     EXPECT_FALSE(find(mesh(), mesh_schema::n_normals));
@@ -84,36 +61,27 @@ TEST_F(Geometry, CornersAreWeldedByPositionAndThenByValue) {
     set(Settings::n_importNormals, Presence::always);
     set(Settings::n_importMultiIndex, Presence::never);
     ASSERT_TRUE(load("cube.obj", cube));
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_positions).size(), 24u);
+    EXPECT_EQ(positions().size(), 24u);
+    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_normals).size(), 24u);
     EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_indices).size(), 24u);
 }
 
-const char* const mixedPolygons = R"(
-v 0 0 0
-v 2 0 0
-v 2 2 0
-v 1 3 0
-v 0 2 0
-v 3 0 0
-v 3 2 0
-f 1 2 3 4 5
-f 2 6 7 3
-f 6 2 1
-f 6 7 2
-)";
+const char* const mixedPolygons =
+    "v 0 0 0\nv 2 0 0\nv 2 2 0\nv 1 3 0\nv 0 2 0\nv 3 0 0\nv 3 2 0\nv 4 1 0\n"
+    "f 1 2 3 4 5\nf 2 6 7 3\nf 7 6 8\n";
 
 TEST_F(Geometry, PolygonsStayAsTheyAreUnlessTriangulated) {
     set(Settings::n_importNormals, Presence::never);
     ASSERT_TRUE(load("mixed.obj", mixedPolygons));
-    EXPECT_EQ(vcounts(), (vector<u16>{5, 4, 3, 3}));
+    EXPECT_EQ(vcounts(), (vector<u16>{5, 4, 3}));
     EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_indices),
-              (vector<u32>{0, 1, 2, 3, 4, 1, 5, 6, 2, 5, 1, 0, 5, 6, 1}));
+              (vector<u32>{0, 1, 2, 3, 4, 1, 5, 6, 2, 6, 5, 7}));
     EXPECT_EQ(getPrimitiveType(mesh(), 0, false), primitiveMixedPolygons);
 
     set(Settings::n_flipNormals, true);
     ASSERT_TRUE(load("mixed.obj", mixedPolygons));
     EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_indices),
-              (vector<u32>{0, 1, 2, 3, 4, 4, 3, 5, 6, 6, 0, 4, 6, 4, 5}));
+              (vector<u32>{0, 1, 2, 3, 4, 4, 3, 5, 6, 5, 7, 6}));
 
     set(Settings::n_flipNormals, false);
     set(Settings::n_importNormals, Presence::always);
@@ -121,40 +89,25 @@ TEST_F(Geometry, PolygonsStayAsTheyAreUnlessTriangulated) {
     ASSERT_TRUE(load("mixed.obj", mixedPolygons));
     EXPECT_EQ(vcounts(), vector<u16>{3});
     // A pentagon makes three triangles, a quad two. The corners they share are welded again.
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_positionIndices).size(), 3u * (3 + 2 + 1 + 1));
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_normals).size(), 21u);
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_positions).size(), 7u);
+    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_positionIndices).size(), 3u * (3 + 2 + 1));
+    EXPECT_EQ(positions().size(), 8u);
+    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_normals), (vector<base::normal>{{0, 0, 1}}));
 }
 
-const char* const sharedVertices = R"(ply
-format ascii 1.0
-element vertex 5
-property float x
-property float y
-property float z
-property uchar red
-property uchar green
-property uchar blue
-property uchar alpha
-element face 2
-property list uchar int vertex_indices
-end_header
-0 0 0 255 0 0 255
-9 9 9 0 0 0 0
-1 0 0 0 255 0 255
-0 1 0 0 0 255 255
-1 1 0 255 255 255 51
-3 0 2 3
-3 2 4 3
-)";
+const char* const sharedVertices =
+    "ply\nformat ascii 1.0\nelement vertex 5\n"
+    "property float x\nproperty float y\nproperty float z\n"
+    "property uchar red\nproperty uchar green\nproperty uchar blue\nproperty uchar alpha\n"
+    "element face 2\nproperty list uchar int vertex_indices\nend_header\n"
+    "0 0 0 255 0 0 255\n9 9 9 0 0 0 0\n1 0 0 0 255 0 255\n0 1 0 0 0 255 255\n"
+    "1 1 0 255 255 255 51\n3 0 2 3\n3 2 4 3\n";
 
 TEST_F(Geometry, SharedVerticesKeepTheirNumbering) {
     set(Settings::n_importNormals, Presence::present);
     ASSERT_TRUE(load("shared.ply", sharedVertices));
     EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_indices), (vector<u32>{0, 1, 2, 1, 3, 2}));
     // Without the vertex that no face uses.
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_positions),
-              (vector<vec3f>{{0, 0, 0}, {1, 0, 0}, {0, 1, 0}, {1, 1, 0}}));
+    EXPECT_EQ(positions(), (vector<vec3f>{{0, 0, 0}, {1, 0, 0}, {0, 1, 0}, {1, 1, 0}}));
     EXPECT_FALSE(find(mesh(), mesh_schema::n_positionIndices));
     base::AttribMap& colors = item(mesh_schema::n_colorSets);
     EXPECT_EQ(valuesOf(colors, meshColorSet_schema::n_RGB),
@@ -168,21 +121,11 @@ TEST_F(Geometry, SharedVerticesKeepTheirNumbering) {
 }
 
 TEST_F(Geometry, LinesAndPointsBecomeObjectsOfTheirOwn) {
-    const char* const text = R"(
-o thing
-v 0 0 0
-v 1 0 0
-v 1 1 0
-v 0 1 0
-v 5 5 5
-f 1 2 3 4
-l 1 2 3
-l 4 5
-p 5 1
-)";
+    const char* const text = "o thing\nv 0 0 0\nv 1 0 0\nv 1 1 0\nv 0 1 0\nv 5 5 5\n"
+                             "f 1 2 3 4\nl 1 2 3\nl 4 5\np 5 1\n";
     ASSERT_TRUE(load("mixed.obj", text));
     EXPECT_EQ(vcounts(), vector<u16>{4});
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_positions).size(), 4u);
+    EXPECT_EQ(positions().size(), 4u);
     const base::IPlugin& lines = only(lines_schema::n_kind);
     EXPECT_EQ(valuesOf(lines, lines_schema::n_points),
               (vector<vec3f>{{0, 0, 0}, {1, 0, 0}, {1, 1, 0}, {0, 1, 0}, {5, 5, 5}}));
@@ -247,7 +190,6 @@ TEST_F(Geometry, TextureSetsKeepNamesAndOrder) {
         ASSERT_TRUE(find(set, meshUVSet_schema::n_name));
         EXPECT_EQ(*find(set, meshUVSet_schema::n_name), names[i]);
         EXPECT_EQ(valuesOf(set, meshUVSet_schema::n_UV).front(), first[i]);
-        EXPECT_EQ(set.typeName(), meshUVSet_schema::n_kind);
     }
 }
 
@@ -255,24 +197,15 @@ TEST_F(Geometry, FacesWithoutAreaAreLeftOut) {
     set(Settings::n_importNormals, Presence::never);
     LogCapture log;
     // The fourth vertex is the first, with negative zeros.
-    const std::string path = write("bad.obj", R"(
-v 0 0 0
-v 1 0 0
-v 0 1 0
-v -0.0 0 -0.0
-v 1 1 0
-f 1 1 1
-f 1 2 3
-f 1 4 2
-f 2 1 2 3
-f 1 2 5 2
-f 3 2 4
-f 1 2 2 5 3 4
-)");
+    const std::string path =
+        write("bad.obj", "v 0 0 0\nv 1 0 0\nv 0 1 0\nv -0.0 0 -0.0\nv 1 1 0\n"
+                         "f 1 1 1\nf 1 2 3\nf 1 4 2\nf 2 1 2 3\nf 1 2 5 2\nf 3 2 4\n"
+                         "f 1 2 2 5 3 4\n");
     ASSERT_TRUE(loadPath(path));
     EXPECT_EQ(vcounts(), (vector<u16>{3, 3, 4}));
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_indices),
-              (vector<u32>{0, 1, 2, 2, 1, 0, 0, 1, 3, 2}));
+    const vec3f a{0, 0, 0}, b{1, 0, 0}, c{0, 1, 0}, d{1, 1, 0};
+    EXPECT_EQ(cornersOf(mesh(), mesh_schema::n_positions, mesh_schema::n_indices),
+              (vector<vec3f>{a, b, c, c, b, a, a, b, d, c}));
     EXPECT_TRUE(
         log.has(base::logInformation, "assimp |" + path + "| Left out 4 faces without area."));
     // Nothing left: no mesh.
@@ -293,8 +226,7 @@ TEST_F(Geometry, ValuesThatAreNotFiniteBecomeZero) {
     LogCapture log;
     const base::string path = write("broken.stl", file);
     ASSERT_TRUE(loadPath(path));
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_positions),
-              (vector<vec3f>{{0, 0, 0}, {0, 2, 0}, {3, 0, 1}}));
+    EXPECT_EQ(positions(), (vector<vec3f>{{0, 0, 0}, {0, 2, 0}, {3, 0, 1}}));
     EXPECT_TRUE(log.has(base::logWarning, "assimp |" + path +
                                               "| Found 2 vertex values that are no finite "
                                               "numbers, zero is taken!"));

@@ -83,4 +83,18 @@ base::vector<T> valuesOf(const base::AttribMap& map,
     return values ? *values : base::vector<T>();
 }
 
+/// The same for each corner: what the indices select, or all values where there are none.
+template <class T>
+base::vector<T> cornersOf(const base::AttribMap& map,
+                          const scene::SchemaAttribute<base::vector<T>>& attribute,
+                          const scene::SchemaAttribute<base::vector<base::u32>>& indices) {
+    const base::vector<T> values = valuesOf(map, attribute);
+    if (!find(map, indices))
+        return values;
+    base::vector<T> corners;
+    for (const base::u32 index : *find(map, indices))
+        corners.push_back(values[index]);
+    return corners;
+}
+
 } // namespace test_support

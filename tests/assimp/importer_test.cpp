@@ -102,19 +102,4 @@ TEST_F(Importer, MessagesOfTheLibraryAreForDebugging) {
     EXPECT_TRUE(log.entries().empty());
 }
 
-TEST_F(Importer, WorksAsAModule) {
-    std::filesystem::create_symlink(TEST_MODULE, folder_ / "scene_assimp.so");
-    SceneFactory factory;
-    factory.loadFrom(folder_.string() + "/");
-    const string path = write("model.obj", triangle);
-    base::AttribMap parameters;
-    ASSERT_TRUE(factory.getImporterParameters(path, parameters));
-    EXPECT_TRUE(parameters.findAttribute(Settings::n_importMeshes));
-    ASSERT_TRUE(factory.load(factory, path, parameters));
-    const auto object = factory.firstOfType(scene_schema::n_kind);
-    ASSERT_TRUE(object);
-    EXPECT_TRUE(findObject(*object, scene_schema::n_root));
-    EXPECT_TRUE(factory.firstOfType(mesh_schema::n_kind));
-}
-
 } // namespace

@@ -1,16 +1,9 @@
 #include "fbx_text.h"
 #include "import_fixture.h"
 
-#include "assimp/import_transform.h"
-#include "scene_transform.h"
-
-#include <cmath>
-#include <random>
-
 namespace {
 
 using namespace scene;
-using base::mat33f;
 using base::mat43;
 using base::vec3d;
 using base::vec3f;
@@ -158,58 +151,6 @@ TEST_F(Nodes, DeepTreesNeedNoStack) {
     ASSERT_TRUE(load("deep.x", text));
     EXPECT_GE(objects(node_schema::n_kind).size(), std::size_t(depth));
     EXPECT_EQ(objects(mesh_schema::n_kind).size(), 1u);
-}
-
-/// The matrix with the given columns.
-mat43 matrixOf(const vec3f& a, const vec3f& b, const vec3f& c) {
-    return {{{a.x, b.x, c.x}, {a.y, b.y, c.y}, {a.z, b.z, c.z}}, {1e6 + 0.125, -2, 3}};
-}
-
-/// Greatest error of a column of what the attributes compose to, as a share of its length.
-double errorOf(const mat43& wanted) {
-    base::AttribMap node;
-    assimp::writeTransform(node, wanted);
-    bool repaired = false;
-    const mat43 found = composeTransform(node, repaired);
-    EXPECT_FALSE(repaired);
-    EXPECT_EQ(found.t, wanted.t);
-    double worst = 0;
-    for (const vec3d& axis : {vec3d{1, 0, 0}, vec3d{0, 1, 0}, vec3d{0, 0, 1}}) {
-        const mat43 linear{wanted.m, {}}, result{found.m, {}};
-        const vec3d w = transformed(linear, axis), f = transformed(result, axis);
-        const double length = std::hypot(w.x, w.y, w.z);
-        const double error = std::hypot(f.x - w.x, f.y - w.y, f.z - w.z);
-        worst = std::max(worst, length > 0 ? error / length : error);
-    }
-    return worst;
-}
-
-TEST_F(Nodes, TransformsComposeToTheMatrix) {
-    std::mt19937 random(7);
-    std::uniform_real_distribution<float> number(-1, 1);
-    const auto column = [&](float size) {
-        return vec3f{number(random) * size, number(random) * size, number(random) * size};
-    };
-    for (int i = 0; i < 2000; ++i) {
-        const vec3f a = column(1), b = column(std::pow(10.0f, 6 * number(random))), c = column(30);
-        const vec3f along{a.x * 3, a.y * 3, a.z * 3};
-        const vec3f nearly{along.x + 1e-4f * b.x, along.y, along.z};
-        // Sheared, nearly flat, flat in a plane, without extent along an axis, mirrored or not.
-        for (const mat43& m : {matrixOf(a, b, c), matrixOf(c, a, nearly), matrixOf(a, along, c),
-                               matrixOf({}, b, c), matrixOf(a, {}, {}), matrixOf(a, c, along)})
-            EXPECT_LT(errorOf(m), 5e-7);
-    }
-    EXPECT_LT(errorOf(matrixOf({}, {}, {})), 1e-15);
-    EXPECT_LT(errorOf(matrixOf({0, 0, -1}, {0, 1, 0}, {1, 0, 0})), 1e-15);
-    EXPECT_LT(errorOf(matrixOf({1, 0, 0}, {2, 1, 0}, {0, 0, -1})), 1e-15);
-
-    // Defaults are not stored.
-    base::AttribMap node;
-    assimp::writeTransform(node, {});
-    EXPECT_EQ(node.size(), 0u);
-    assimp::writeTransform(node, {{{0, -1, 0}, {1, 0, 0}, {0, 0, 1}}, {}});
-    EXPECT_EQ(node.size(), 1u);
-    EXPECT_TRUE(find(node, node_schema::n_rotate));
 }
 
 } // namespace

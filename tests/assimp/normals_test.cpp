@@ -11,14 +11,19 @@ using base::u32;
 using base::vec3f;
 using base::vec4f;
 using base::vector;
+using test_support::cornersOf;
 using test_support::Import;
 using test_support::LogCapture;
-using test_support::valuesOf;
 
 class Normals : public Import {
 protected:
-    vector<normal> normals() { return valuesOf(mesh(), mesh_schema::n_normals); }
-    vector<vec4f> tangents() { return valuesOf(mesh(), mesh_schema::n_tangents); }
+    /// Of the corners.
+    vector<normal> normals() {
+        return cornersOf(mesh(), mesh_schema::n_normals, mesh_schema::n_normalIndices);
+    }
+    vector<vec4f> tangents() {
+        return cornersOf(mesh(), mesh_schema::n_tangents, mesh_schema::n_tangentIndices);
+    }
 };
 
 void expectNear(const normal& found, const vec3f& wanted) {
@@ -29,15 +34,8 @@ void expectNear(const normal& found, const vec3f& wanted) {
 
 /// Two squares of side 1 that meet in the Y axis: one lies in the XY plane, the other falls off
 /// to the other side by a slope of 4/3 (53.13 degrees). They share vertices.
-const char* const hinge = R"(ply
-format ascii 1.0
-element vertex 6
-property float x
-property float y
-property float z
-element face 2
-property list uchar int vertex_indices
-end_header
+const char* const hinge = R"(OFF
+6 2 0
 0 0 0
 1 0 0
 1 1 0
@@ -65,7 +63,7 @@ TEST_F(Normals, AreSmoothUpToTheAngle) {
         SCOPED_TRACE(c.angle);
         set(Settings::n_computeNormalsMethod, c.method);
         set(Settings::n_computeNormalsAngle, c.angle);
-        ASSERT_TRUE(load("hinge.ply", hinge));
+        ASSERT_TRUE(load("hinge.off", hinge));
         const vector<normal> found = normals();
         ASSERT_EQ(found.size(), 8u);
         const vec3f wanted[8] = {c.isSmooth ? mean : up,
@@ -84,7 +82,7 @@ TEST_F(Normals, AreSmoothUpToTheAngle) {
         }
     }
     set(Settings::n_importNormals, Presence::present);
-    ASSERT_TRUE(load("hinge.ply", hinge));
+    ASSERT_TRUE(load("hinge.off", hinge));
     EXPECT_TRUE(normals().empty());
 }
 
@@ -198,7 +196,8 @@ TEST_F(Normals, TangentsOfTheFileGetTheSideOfTheBitangents) {
     EXPECT_TRUE(log.has(base::logWarning, "assimp |" + path +
                                               "| Found 1 tangents without a direction, any are "
                                               "taken!"));
-    EXPECT_EQ(valuesOf(mesh(), mesh_schema::n_bitangents)[3], (normal{0, -1, 0}));
+    EXPECT_EQ(cornersOf(mesh(), mesh_schema::n_bitangents, mesh_schema::n_tangentIndices)[3],
+              (normal{0, -1, 0}));
 
     // The other way round the normals change sides, the texture does not.
     set(Settings::n_flipNormals, true);

@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 
 #include <limits>
+#include <utility>
 
 namespace {
 
@@ -94,31 +95,23 @@ TEST_F(Nodes, ThoseThatDoNotInheritStayInTheWorld) {
     EXPECT_TRUE(log.entries().empty());
 }
 
-TEST_F(Nodes, UnknownOrFlatParentsAreIgnoredWithOneWarning) {
-    INode& orphan = addAt(nullptr, {3, 4, 5});
-    write(orphan, node_schema::n_name) = "orphan";
+TEST_F(Nodes, TellWhatTheyDoWithout) {
     INode& flat = add();
     write(flat, node_schema::n_scale) = {1, 0, 1};
     INode& child = addAt(&flat, {6, 7, 8});
-    for (INode* node : {&orphan, &child})
-        write(*node, node_schema::n_inheritsTransform) = false;
-    const LogCapture log;
-    for (int i = 0; i < 3; ++i) {
-        EXPECT_EQ(local(orphan), (vec3d{3, 4, 5}));
-        EXPECT_EQ(local(child), (vec3d{6, 7, 8}));
-    }
-    ASSERT_EQ(log.entries().size(), 2u);
-    EXPECT_EQ(log.entries()[0].level, base::logWarning);
-    EXPECT_EQ(log.entries()[0].channel, base::logScene);
-    EXPECT_TRUE(log.entries()[0].text.starts_with("gltf |orphan| "));
-}
+    mat43 flatWorld, m;
+    flat.getWorldTransform(flatWorld);
+    EXPECT_EQ(child.getTransform(m, &flatWorld), 0u);
 
-TEST_F(Nodes, NumbersThatAreNotFiniteWarnOnce) {
-    INode& node = addAt(nullptr, {0, std::numeric_limits<double>::infinity(), 0});
-    const LogCapture log;
-    EXPECT_EQ(local(node), vec3d());
-    EXPECT_EQ(local(node), vec3d());
-    EXPECT_EQ(log.entries().size(), 1u);
+    write(child, node_schema::n_inheritsTransform) = false;
+    for (const mat43* parentWorld :
+         {static_cast<const mat43*>(nullptr), &std::as_const(flatWorld)}) {
+        EXPECT_EQ(child.getTransform(m, parentWorld), INode::faultParent);
+        EXPECT_EQ(m.t, (vec3d{6, 7, 8}));
+    }
+    write(child, node_schema::n_translate).y = std::numeric_limits<double>::infinity();
+    EXPECT_EQ(child.getTransform(m, nullptr), INode::faultParent | INode::faultNotFinite);
+    EXPECT_EQ(m.t, vec3d());
 }
 
 TEST_F(Nodes, CyclesEnd) {

@@ -287,26 +287,70 @@ TEST_F(Transform, ProductsAndInverses) {
     EXPECT_EQ(inverse, before);
 }
 
-TEST_F(Transform, StoredTransformsComposeToThemselves) {
-    const base::mat33f cases[] = {
-        {},
-        {{0, -2, 0}, {2, 0, 0}, {0, 0, 2}},
-        {{-1, 0, 0}, {0, 2, 0}, {0, 0, 3}},
-        {{1, 5, 7}, {0, 2, 9}, {0, 0, 3}},
-        {{0.3f, -1, 2}, {4, 0.5f, 1}, {-1, 1, 1}},
-    };
-    for (const base::mat33f& m : cases) {
-        node_.clear();
-        write(node_, node_schema::n_transformation) = 1;
-        write(node_, node_schema::n_rotateMode) = 0;
-        write(node_, node_schema::n_rotateEuler) = {1, 2, 3};
-        write(node_, node_schema::n_rotatePivot) = {1, 2, 3};
-        write(node_, node_schema::n_scalePivot) = {4, 5, 6};
-        put(node_schema::n_translate, vec3f{9, 9, 9});
-        const mat43 wanted{m, {1e6 + 0.125, 2, -3}};
-        storeTransform(node_, wanted);
-        expectNear(compose(), wanted, 5e-6);
+/// The matrix with the given columns.
+mat43 matrixOf(const vec3f& a, const vec3f& b, const vec3f& c) {
+    return {{{a.x, b.x, c.x}, {a.y, b.y, c.y}, {a.z, b.z, c.z}}, {1e6 + 0.125, -2, 3}};
+}
+
+/// Greatest error of a column, as a share of its length.
+double errorOf(const mat43& found, const mat43& wanted) {
+    double worst = 0;
+    for (const vec3d& axis : {vec3d{1, 0, 0}, vec3d{0, 1, 0}, vec3d{0, 0, 1}}) {
+        const vec3d w = image({wanted.m, {}}, axis), f = image({found.m, {}}, axis);
+        const double length = std::hypot(w.x, w.y, w.z);
+        const double error = std::hypot(f.x - w.x, f.y - w.y, f.z - w.z);
+        worst = std::max(worst, length > 0 ? error / length : error);
     }
+    return worst;
+}
+
+TEST_F(Transform, StoredTransformsComposeToThemselves) {
+    const auto stored = [&](const mat43& wanted) {
+        storeTransform(node_, wanted);
+        const mat43 found = compose();
+        EXPECT_EQ(found.t, wanted.t);
+        return errorOf(found, wanted);
+    };
+    std::mt19937 random(7);
+    std::uniform_real_distribution<float> number(-1, 1);
+    const auto column = [&](float size) {
+        return vec3f{number(random) * size, number(random) * size, number(random) * size};
+    };
+    for (int i = 0; i < 2000; ++i) {
+        const vec3f a = column(1), b = column(std::pow(10.0f, 6 * number(random))), c = column(30);
+        const vec3f along{a.x * 3, a.y * 3, a.z * 3};
+        const vec3f nearly{along.x + 1e-4f * b.x, along.y, along.z};
+        // Sheared, nearly flat, flat in a plane, without extent along an axis, mirrored or not.
+        for (const mat43& m : {matrixOf(a, b, c), matrixOf(c, a, nearly), matrixOf(a, along, c),
+                               matrixOf({}, b, c), matrixOf(a, {}, {}), matrixOf(a, c, along)})
+            EXPECT_LT(stored(m), 5e-7);
+    }
+    EXPECT_LT(stored(matrixOf({}, {}, {})), 1e-15);
+    EXPECT_LT(stored(matrixOf({0, 0, -1}, {0, 1, 0}, {1, 0, 0})), 1e-15);
+    EXPECT_LT(stored(matrixOf({1, 0, 0}, {2, 1, 0}, {0, 0, -1})), 1e-15);
+    EXPECT_LT(stored(matrixOf({3e38f, 3e38f, 0}, {0, 1e-45f, 0}, {0, 1e-45f, 1})), 1);
+}
+
+TEST_F(Transform, StoringReplacesWhatWasThere) {
+    base::AttribMap parent;
+    node_.setParent(&parent);
+    write(parent, node_schema::n_shear) = {1, 0, 0};
+    write(node_, node_schema::n_transformation) = 1;
+    write(node_, node_schema::n_rotateMode) = 0;
+    write(node_, node_schema::n_rotateEuler) = {1, 2, 3};
+    write(node_, node_schema::n_rotatePivot) = {1, 2, 3};
+    write(node_, node_schema::n_scalePivot) = {4, 5, 6};
+    put(node_schema::n_translate, vec3f{9, 9, 9});
+    const mat43 wanted{{{-1, 0, 0}, {0, 2, 0}, {0, 0, 3}}, {1, 2, 3}};
+    storeTransform(node_, wanted);
+    EXPECT_EQ(compose(), wanted); // mirrored without a rotation, which would not be exact
+    node_.setParent(nullptr);
+
+    node_.clear();
+    storeTransform(node_, {{{0, -1, 0}, {1, 0, 0}, {0, 0, 1}}, {}});
+    EXPECT_EQ(node_.size(), 1u); // the rotation
+    storeTransform(node_, {});
+    EXPECT_EQ(node_.size(), 0u);
 }
 
 } // namespace

@@ -1,6 +1,6 @@
 #include "gltf_container.h"
 
-#include <algorithm>
+#include <cstddef>
 #include <fstream>
 #include <iterator>
 
@@ -66,7 +66,7 @@ Bytes decodeBase64(std::string_view text) {
             bytes.push_back(static_cast<uint8_t>(group >> shift & 0xFF));
         }
     }
-    bytes.resize(bytes.size() - padding);
+    bytes.erase(bytes.end() - static_cast<std::ptrdiff_t>(padding), bytes.end());
     return bytes;
 }
 
