@@ -8,10 +8,6 @@
 #include <limits>
 #include <optional>
 
-namespace draco {
-class Mesh;
-}
-
 /// A write-only object model of a glTF 2.0 document.
 ///
 /// The exporter builds a graph of counted objects under an `Asset`, the asset's passes rearrange
@@ -65,8 +61,16 @@ struct Options {
 
 class Extension;
 
+/// Base of the counted classes here. A document has a dozen objects for every mesh, so they have
+/// memory of their own, see object_pool.h.
+class Counted : public base::RefCnt {
+public:
+    static void* operator new(std::size_t byteCount);
+    static void operator delete(void* block, std::size_t byteCount) noexcept;
+};
+
 /// Base of everything that is written as a JSON object.
-class Object : public base::RefCnt {
+class Object : public Counted {
 public:
     ~Object() override;
     /// What `getStringId` begins with.
@@ -338,7 +342,7 @@ using AttributeMap = flat_map<string, ref<Accessor>>;
 class Primitive : public Object {
 public:
     /// Attributes of one morph target; part of its primitive, without an index.
-    class Target : public base::RefCnt {
+    class Target : public Counted {
     public:
         ~Target() override;
         AttributeMap attributes;
@@ -382,7 +386,7 @@ public:
 class Node : public Object {
 public:
     /// Writes nothing of its own: an identity.
-    class Transform : public base::RefCnt {
+    class Transform : public Counted {
     public:
         enum class Type : i32 { none = -1, trs = 0, matrix = 1 };
         ~Transform() override;
@@ -481,47 +485,54 @@ public:
 /// of the same scene compare byte by byte.
 class DracoAttributeIds {
 public:
-    DracoAttributeIds();
-    void insert(string name, i32 id);
-    i32 find(string_view name) const; ///< -1 if absent
-    /// The entries in iteration order.
-    vector<std::pair<string, i32>> entries() const;
-
-private:
     struct Entry {
         string name;
         i32 id;
         u32 hash;
     };
-    void rehash(u32 bucketCount);
-    vector<vector<Entry>> buckets_; ///< each from front to back
-    u32 count_ = 0;
+    void insert(string name, i32 id);
+    i32 find(string_view name) const;                         ///< -1 if absent
+    const vector<Entry>& entries() const { return entries_; } ///< in iteration order
+
+private:
+    void place(Entry entry);
+    u32 bucketCount_ = 1;
+    vector<Entry> entries_; ///< bucket by bucket, each from front to back
 };
 
 /// One Draco stream for a whole mesh; all primitives of the mesh share the object.
 class DracoExtension : public Extension {
 public:
-    /// Prepares a mesh for the encoder. `indices` (three a face) may be null: then every three
+    /// Takes a mesh for the encoder. `indices` (u32, three a face) may be null: then every three
     /// vertices of "POSITION" are a face. The values are read from the start of each accessor's
-    /// private buffer.
+    /// private buffer when they are encoded; until then the extension holds the buffers.
     ///
     /// Null where the encoder would fail or crash: without "POSITION", with unequal counts, an
     /// index past the end, no face of three distinct vertices, or values that are not finite or
     /// whose range is not. `reason` then tells which.
-    static ref<DracoExtension> make(const AttributeMap& attributes, const u32* indices,
-                                    std::size_t indexCount, string& reason);
+    static ref<DracoExtension> make(const AttributeMap& attributes, ref<Buffer> indices,
+                                    string& reason);
     ~DracoExtension() override;
     /// Writes "bufferView" and "attributes" and nothing else.
     void writeJSON(JsonWriter& writer, const Options& options) override;
-    /// Encodes the mesh into `bufferView` and drops it. False if the encoder refuses.
+    /// Encodes the mesh into `bufferView` and lets go of its buffers. False if the encoder refuses.
     bool encode(const Options& options);
 
     ref<BufferView> bufferView; ///< null until encoded
     DracoAttributeIds attributeToId;
-    std::unique_ptr<draco::Mesh> dracoMesh; ///< null once encoded
 
 private:
-    DracoExtension();
+    struct Attribute {
+        i32 kind; ///< the encoder's
+        i32 components;
+        i32 componentType;
+        ref<Buffer> values;
+    };
+    DracoExtension() = default;
+
+    u32 pointCount_ = 0;
+    ref<Buffer> indices_;
+    vector<Attribute> attributes_; ///< by id
 };
 
 // Root

@@ -13,6 +13,7 @@
 #include <cfloat>
 #include <cmath>
 #include <numeric>
+#include <utility>
 
 namespace GLTF {
 
@@ -145,13 +146,15 @@ string meshFault(const AttributeMap& attributes, const u32* indices, std::size_t
     const i32 pointCount = (*position)->count;
     if (pointCount < 1 || (!indices && pointCount < 3))
         return "there are too few vertices for a triangle";
-    if (indices && indexCount > static_cast<std::size_t>(std::numeric_limits<i32>::max()))
-        return "there are too many indices";
     for (const auto& [name, accessor] : attributes) {
         if (string fault = attributeFault(name, accessor.get(), pointCount); !fault.empty())
             return fault;
     }
     return indices ? indexFault(indices, indexCount, static_cast<u32>(pointCount)) : string();
+}
+
+const u32* indicesIn(const Buffer* buffer) {
+    return buffer ? reinterpret_cast<const u32*>(buffer->data) : nullptr;
 }
 
 void setFaces(draco::Mesh& mesh, const u32* indices, u32 cornerCount) {
@@ -165,83 +168,77 @@ void setFaces(draco::Mesh& mesh, const u32* indices, u32 cornerCount) {
     }
 }
 
-i32 addAttribute(draco::Mesh& mesh, const string& name, const Accessor& accessor) {
-    const bool isU16 = accessor.componentType == componentU16;
-    const i32 components = accessor.getNumberOfComponents();
+void addAttribute(draco::Mesh& mesh, GeometryAttribute::Type kind, i32 components,
+                  i32 componentType, const u8* values) {
+    const i64 stride = i64(components) * Accessor::componentByteLength(componentType);
     GeometryAttribute attribute;
-    attribute.Init(attributeKind(name), nullptr, static_cast<u8>(components),
-                   isU16 ? draco::DT_UINT16 : draco::DT_FLOAT32, false,
-                   i64(components) * accessor.getComponentByteLength(), 0);
-    const i32 id = mesh.AddAttribute(attribute, true, static_cast<u32>(accessor.count));
-    mesh.attribute(id)->buffer()->Write(0, dataOf(accessor),
-                                        static_cast<std::size_t>(dataByteLength(accessor)));
-    return id;
+    attribute.Init(kind, nullptr, static_cast<u8>(components),
+                   componentType == componentU16 ? draco::DT_UINT16 : draco::DT_FLOAT32, false,
+                   stride, 0);
+    const i32 id = mesh.AddAttribute(attribute, true, mesh.num_points());
+    mesh.attribute(id)->buffer()->Write(0, values,
+                                        static_cast<std::size_t>(stride) * mesh.num_points());
 }
 
 } // namespace
 
-DracoAttributeIds::DracoAttributeIds() : buckets_(1) {}
-
 void DracoAttributeIds::insert(string name, i32 id) {
-    if (count_ + 1 > buckets_.size())
-        rehash(nextPrime(2 * static_cast<u32>(buckets_.size())));
+    if (entries_.size() + 1 > bucketCount_) {
+        bucketCount_ = nextPrime(2 * bucketCount_);
+        for (Entry& entry : std::exchange(entries_, {}))
+            place(std::move(entry));
+    }
     const u32 hash = nameHash(name);
-    auto& bucket = buckets_[hash % buckets_.size()];
-    bucket.insert(bucket.begin(), {std::move(name), id, hash});
-    ++count_;
+    place({std::move(name), id, hash});
+}
+
+/// To the front of its bucket.
+void DracoAttributeIds::place(Entry entry) {
+    const u32 bucket = entry.hash % bucketCount_;
+    const auto isBefore = [&](const Entry& other) { return other.hash % bucketCount_ < bucket; };
+    const auto at = std::find_if_not(entries_.cbegin(), entries_.cend(), isBefore);
+    entries_.insert(at, std::move(entry));
 }
 
 i32 DracoAttributeIds::find(string_view name) const {
-    for (const Entry& entry : buckets_[nameHash(name) % buckets_.size()]) {
+    for (const Entry& entry : entries_) {
         if (entry.name == name)
             return entry.id;
     }
     return -1;
 }
 
-vector<std::pair<string, i32>> DracoAttributeIds::entries() const {
-    vector<std::pair<string, i32>> all;
-    for (const auto& bucket : buckets_) {
-        for (const Entry& entry : bucket)
-            all.emplace_back(entry.name, entry.id);
-    }
-    return all;
-}
-
-/// Moves the entries bucket by bucket, each to the front of its new bucket.
-void DracoAttributeIds::rehash(u32 bucketCount) {
-    vector<vector<Entry>> buckets(bucketCount);
-    for (auto& bucket : buckets_) {
-        for (Entry& entry : bucket) {
-            auto& target = buckets[entry.hash % bucketCount];
-            target.insert(target.begin(), std::move(entry));
-        }
-    }
-    buckets_.swap(buckets);
-}
-
-DracoExtension::DracoExtension() = default;
 DracoExtension::~DracoExtension() = default;
 
-ref<DracoExtension> DracoExtension::make(const AttributeMap& attributes, const u32* indices,
-                                         std::size_t indexCount, string& reason) {
-    reason = meshFault(attributes, indices, indexCount);
+ref<DracoExtension> DracoExtension::make(const AttributeMap& attributes, ref<Buffer> indices,
+                                         string& reason) {
+    const std::size_t indexCount =
+        indices ? static_cast<std::size_t>(indices->byteLength) / sizeof(u32) : 0;
+    reason = meshFault(attributes, indicesIn(indices.get()), indexCount);
     if (!reason.empty())
         return nullptr;
 
-    auto mesh = std::make_unique<draco::Mesh>();
-    const u32 pointCount = static_cast<u32>((*attributes.get("POSITION"))->count);
-    setFaces(*mesh, indices, indices ? static_cast<u32>(indexCount) : pointCount);
-    mesh->set_num_points(pointCount);
-
     ref<DracoExtension> extension(new DracoExtension);
-    for (const auto& [name, accessor] : attributes)
-        extension->attributeToId.insert(name, addAttribute(*mesh, name, *accessor));
-    extension->dracoMesh = std::move(mesh);
+    extension->pointCount_ = static_cast<u32>((*attributes.get("POSITION"))->count);
+    extension->indices_ = std::move(indices);
+    extension->attributes_.reserve(attributes.size());
+    for (const auto& [name, accessor] : attributes) {
+        extension->attributeToId.insert(name, static_cast<i32>(extension->attributes_.size()));
+        extension->attributes_.push_back({attributeKind(name), accessor->getNumberOfComponents(),
+                                          accessor->componentType, accessor->bufferView->buffer});
+    }
     return extension;
 }
 
 bool DracoExtension::encode(const Options& options) {
+    draco::Mesh mesh;
+    const u32* indices = indicesIn(indices_.get());
+    setFaces(mesh, indices, indices ? static_cast<u32>(indices_->byteLength) / 4 : pointCount_);
+    mesh.set_num_points(pointCount_);
+    for (const Attribute& attribute : std::as_const(attributes_))
+        addAttribute(mesh, static_cast<GeometryAttribute::Type>(attribute.kind),
+                     attribute.components, attribute.componentType, attribute.values->data);
+
     draco::Encoder encoder;
     encoder.SetAttributeQuantization(GeometryAttribute::POSITION, options.positionBits);
     encoder.SetAttributeQuantization(GeometryAttribute::TEX_COORD, options.texCoordBits);
@@ -249,7 +246,7 @@ bool DracoExtension::encode(const Options& options) {
     encoder.SetAttributeQuantization(GeometryAttribute::COLOR, options.colorBits);
     encoder.SetAttributeQuantization(GeometryAttribute::GENERIC, options.jointBits);
     draco::EncoderBuffer encoded;
-    if (!encoder.EncodeMeshToBuffer(*dracoMesh, &encoded).ok())
+    if (!encoder.EncodeMeshToBuffer(mesh, &encoded).ok())
         return false;
     if (encoded.size() > static_cast<std::size_t>(std::numeric_limits<i32>::max()))
         throw base::exception(
@@ -257,7 +254,8 @@ bool DracoExtension::encode(const Options& options) {
                          encoded.size()),
             "draco", "GLTF::DracoExtension::encode", __LINE__);
 
-    dracoMesh.reset();
+    attributes_.clear();
+    indices_.reset();
     bufferView = base::makeRef<BufferView>(encoded.data(), static_cast<i32>(encoded.size()),
                                            BufferView::noTarget, true);
     return true;
@@ -267,9 +265,9 @@ void DracoExtension::writeJSON(JsonWriter& writer, const Options&) {
     if (bufferView)
         writer.intMember("bufferView", bufferView->id);
     writer.startObject("attributes");
-    for (const auto& [name, id] : attributeToId.entries()) {
-        writer.keyText(name);
-        writer.intValue(id);
+    for (const DracoAttributeIds::Entry& entry : attributeToId.entries()) {
+        writer.keyText(entry.name);
+        writer.intValue(entry.id);
     }
     writer.endObject();
 }

@@ -1,6 +1,7 @@
 #include "GLTF/document.h"
 
 #include "GLTF/json_writer.h"
+#include "GLTF/object_pool.h"
 #include "GLTF/walk.h"
 
 namespace GLTF {
@@ -20,6 +21,14 @@ void writeObjects(JsonWriter& writer, const Objects& objects, const Options& opt
 }
 
 } // namespace
+
+void* Counted::operator new(std::size_t byteCount) {
+    return object_pool::allocate(byteCount);
+}
+
+void Counted::operator delete(void* block, std::size_t byteCount) noexcept {
+    object_pool::free(block, byteCount);
+}
 
 u32 Walk::nextNumber() noexcept {
     static u32 number = 0;

@@ -113,7 +113,7 @@ void Asset::removeUncompressedBufferViews() {
 bool Asset::compressPrimitives(const Options& options) {
     for (Primitive* primitive : getAllPrimitives()) {
         DracoExtension* draco = primitive->draco();
-        if (draco && draco->dracoMesh && !draco->encode(options))
+        if (draco && !draco->bufferView && !draco->encode(options))
             return false;
     }
     return true;

@@ -224,7 +224,7 @@ ref<GLTF::Mesh> GLTFScenePlugin::convertMesh(scene::IMesh& mesh, bool withTarget
         log().log(logScene, logError, "validate |{}| Found face index out of range at position {}!",
                   mesh.getName(), indices.findOutOfRange());
     else if (exportCompress && !withTargets && allTriangles)
-        compressMesh(*gltfMesh, mesh, indices);
+        compressMesh(*gltfMesh, mesh);
     return gltfMesh;
 }
 
@@ -270,11 +270,12 @@ bool GLTFScenePlugin::convertPrimitives(GLTF::Mesh& gltfMesh, scene::IMesh& mesh
 }
 
 /// Prepares one Draco stream of all indices, which the primitives share.
-void GLTFScenePlugin::compressMesh(GLTF::Mesh& gltfMesh, const scene::IMesh& mesh,
-                                   const MeshIndices& indices) {
+void GLTFScenePlugin::compressMesh(GLTF::Mesh& gltfMesh, const scene::IMesh& mesh) {
     string reason;
+    const GLTF::Primitive& first = *std::as_const(gltfMesh).primitives[0];
+    // The primitives have ranges of one array.
     const auto extension = GLTF::DracoExtension::make(
-        std::as_const(gltfMesh).primitives[0]->attributes, indices.data(), indices.count(), reason);
+        first.attributes, first.indices ? first.indices->bufferView->buffer : nullptr, reason);
     if (!extension) {
         log().log(logScene, logError, "gltf |{}| The mesh can't be compressed, it stays plain: {}!",
                   mesh.getName(), reason);

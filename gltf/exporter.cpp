@@ -50,8 +50,8 @@ ref<GLTF::Buffer> runPasses(GLTF::Asset& asset, const GLTF::Options& options,
     if (auto& roots = asset.getDefaultScene().nodes; roots.empty())
         roots.push_back(gltfRoot);
     if (options.useDraco) {
-        asset.removeUncompressedBufferViews();
         asset.compressPrimitives(options);
+        asset.removeUncompressedBufferViews();
     }
     return asset.packAccessors();
 }

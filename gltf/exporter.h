@@ -76,7 +76,7 @@ private:
     void convertLinesChild(GLTF::Node& gltfNode, base::IPlugin& child);
 
     bool convertPrimitives(GLTF::Mesh& gltfMesh, scene::IMesh& mesh, MeshIndices& indices);
-    void compressMesh(GLTF::Mesh& gltfMesh, const scene::IMesh& mesh, const MeshIndices& indices);
+    void compressMesh(GLTF::Mesh& gltfMesh, const scene::IMesh& mesh);
     GLTF::Material* getEdgeMaterial(const scene::ILines& lines);
 
     /// Meshes that morph objects deform: their vertices must stay apart where the targets' do.
