@@ -4,6 +4,7 @@
 #include "assimp/import_geometry.h"
 #include "assimp/import_nodes.h"
 #include "assimp/library_text.h"
+#include "assimp/ply_header.h"
 
 #include "b_log.h"
 #include "b_string_convert.h"
@@ -80,6 +81,10 @@ private:
 std::unique_ptr<aiScene> readFile(const base::string& path, base::string& error) {
     const LibraryLog log;
     try {
+        if (!isPlyHeaderWhole(path)) {
+            error = "The header has no end.";
+            return nullptr;
+        }
         Assimp::Importer importer;
         // Files without meshes get none that show their skeleton.
         importer.SetPropertyBool(AI_CONFIG_IMPORT_NO_SKELETON_MESHES, true);

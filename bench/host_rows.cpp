@@ -11,28 +11,47 @@ namespace bench {
 
 namespace {
 
-/// A square of 4 by 4 fields of two triangles, with normals and texture coordinates.
-void writeModel(const std::string& path) {
-    constexpr int size = 4, lineLength = size + 1;
+constexpr int size = 4, lineLength = size + 1; ///< a square of 4 by 4 fields of two triangles
+
+/// Calls `function` with the numbers of the vertices of each triangle, from 0 on.
+template <class Function>
+void forEachTriangle(const Function& function) {
+    for (int y = 0; y < size; ++y) {
+        for (int x = 0; x < size; ++x) {
+            const int first = y * lineLength + x, above = first + lineLength;
+            function(first, first + 1, above + 1);
+            function(first, above + 1, above);
+        }
+    }
+}
+
+void writePly(const std::string& path) {
+    std::ofstream file(path);
+    file << "ply\nformat ascii 1.0\nelement vertex " << lineLength * lineLength
+         << "\nproperty float x\nproperty float y\nproperty float z\nproperty float nx\n"
+            "property float ny\nproperty float nz\nproperty float s\nproperty float t\n"
+            "element face "
+         << 2 * size * size << "\nproperty list uchar int vertex_indices\nend_header\n";
+    for (int i = 0; i < lineLength * lineLength; ++i)
+        file << i % lineLength << ' ' << i / lineLength << " 0 0 0 1 " << 0.25 * (i % lineLength)
+             << ' ' << 0.25 * (i / lineLength) << '\n';
+    forEachTriangle(
+        [&](int a, int b, int c) { file << "3 " << a << ' ' << b << ' ' << c << '\n'; });
+}
+
+void writeObj(const std::string& path) {
     std::ofstream file(path);
     for (int i = 0; i < lineLength * lineLength; ++i) {
         file << "v " << i % lineLength << ' ' << i / lineLength << " 0\n";
         file << "vt " << 0.25 * (i % lineLength) << ' ' << 0.25 * (i / lineLength) << '\n';
     }
     file << "vn 0 0 1\n";
-    const auto corner = [&](int vertex) { file << ' ' << vertex << '/' << vertex << "/1"; };
-    for (int y = 0; y < size; ++y) {
-        for (int x = 0; x < size; ++x) {
-            const int first = y * lineLength + x + 1, above = first + lineLength;
-            for (const int second : {0, 1}) {
-                file << 'f';
-                corner(first);
-                corner(second ? above + 1 : first + 1);
-                corner(second ? above : above + 1);
-                file << '\n';
-            }
-        }
-    }
+    forEachTriangle([&](int a, int b, int c) {
+        file << 'f';
+        for (const int corner : {a + 1, b + 1, c + 1})
+            file << ' ' << corner << '/' << corner << "/1";
+        file << '\n';
+    });
 }
 
 double secondsOf(const timeval& time) {
@@ -53,11 +72,9 @@ rusage runProgram(std::string input, std::string output) {
     return usage;
 }
 
-void host(benchmark::State& state) {
-    const OutputFolder folder;
-    writeModel(folder / "model.obj");
+void runOn(benchmark::State& state, const std::string& model, const std::string& output) {
     for (auto _ : state) {
-        const rusage usage = runProgram(folder / "model.obj", folder / "model.glb");
+        const rusage usage = runProgram(model, output);
         const double seconds = secondsOf(usage.ru_utime) + secondsOf(usage.ru_stime);
         state.SetIterationTime(seconds);
         state.counters["seconds"] = seconds;
@@ -66,7 +83,20 @@ void host(benchmark::State& state) {
     }
 }
 
-BENCH_ROW(host, "host/small");
+void hostPly(benchmark::State& state) {
+    const OutputFolder folder;
+    writePly(folder / "model.ply");
+    runOn(state, folder / "model.ply", folder / "model.glb");
+}
+
+void hostObj(benchmark::State& state) {
+    const OutputFolder folder;
+    writeObj(folder / "model.obj");
+    runOn(state, folder / "model.obj", folder / "model.glb");
+}
+
+BENCH_ROW(hostPly, "host/ply");
+BENCH_ROW(hostObj, "host/obj");
 
 } // namespace
 

@@ -36,6 +36,25 @@ std::unique_ptr<base::Attribute> makeArray(vector<u32> values, u32 flags = 0) {
     return array;
 }
 
+bool anySetHasIndices(const AttribMap& mesh, const SchemaAttribute<Items>& sets, name_id indices) {
+    const u32 count = getListCount(mesh, sets);
+    for (u32 i = 0; i < count; ++i) {
+        const AttribMap* set = findListItem(mesh, sets, i);
+        if (set && findIndices(*set, indices))
+            return true;
+    }
+    return false;
+}
+
+/// True if some array has indices of its own. A mesh without them is as it should be.
+bool hasOwnIndices(const AttribMap& mesh) {
+    return findIndices(mesh, mesh_schema::n_positionIndices) ||
+           findIndices(mesh, mesh_schema::n_normalIndices) ||
+           findIndices(mesh, mesh_schema::n_tangentIndices) ||
+           anySetHasIndices(mesh, mesh_schema::n_uvSets, meshUVSet_schema::n_indices) ||
+           anySetHasIndices(mesh, mesh_schema::n_colorSets, meshColorSet_schema::n_indices);
+}
+
 class SingleIndexConversion {
 public:
     SingleIndexConversion(AttribMap& mesh, bool isMorphBase)
@@ -296,7 +315,7 @@ void SingleIndexConversion::removeTriangleRanges() {
 } // namespace
 
 bool convertToSingleIndex(AttribMap& mesh, bool isMorphBase) {
-    return SingleIndexConversion(mesh, isMorphBase).run();
+    return !hasOwnIndices(mesh) || SingleIndexConversion(mesh, isMorphBase).run();
 }
 
 VertexOrigins findVertexOrigins(const AttribMap& mesh) {

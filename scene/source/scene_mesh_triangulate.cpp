@@ -11,6 +11,7 @@
 #include <memory>
 #include <numeric>
 #include <span>
+#include <utility>
 
 namespace scene {
 
@@ -39,10 +40,31 @@ FaceSizes readPolygonSizes(const AttribMap& primitive) {
     return lines ? FaceSizes() : sizes;
 }
 
+vector<AttribMap*> findPrimitives(AttribMap& mesh) {
+    vector<AttribMap*> primitives;
+    const u32 count = getListCount(mesh, mesh_schema::n_primitives);
+    for (u32 i = 0; i < count; ++i)
+        if (AttribMap* primitive = findListItem(mesh, mesh_schema::n_primitives, i))
+            primitives.push_back(primitive);
+    return primitives;
+}
+
+/// A list of sizes needs work even if it holds triangles alone: readers take faces of mixed size
+/// for polygons.
+bool needsTriangulation(const vector<AttribMap*>& primitives, u32 largestFace) {
+    return std::ranges::any_of(primitives, [&](const AttribMap* primitive) {
+        const FaceSizes sizes = readPolygonSizes(*primitive);
+        return sizes.list || sizes.single > largestFace;
+    });
+}
+
 class MeshTriangulation {
 public:
-    MeshTriangulation(AttribMap& mesh, const vector<base::vec3f>& positions, u32 largestFace);
-    bool isNeeded() const;
+    MeshTriangulation(AttribMap& mesh, const vector<base::vec3f>& positions,
+                      vector<AttribMap*> primitives, u32 largestFace)
+        : mesh_(mesh), name_(objectName(mesh)), positionCount_(static_cast<u32>(positions.size())),
+          largestFace_(largestFace), primitives_(std::move(primitives)),
+          polygons_(positions, name_) {}
     bool run();
 
 private:
@@ -66,25 +88,6 @@ private:
     PolygonTriangulator polygons_;
     MeshEdit edit_;
 };
-
-MeshTriangulation::MeshTriangulation(AttribMap& mesh, const vector<base::vec3f>& positions,
-                                     u32 largestFace)
-    : mesh_(mesh), name_(objectName(mesh)), positionCount_(static_cast<u32>(positions.size())),
-      largestFace_(largestFace), polygons_(positions, name_) {
-    const u32 count = getListCount(mesh, mesh_schema::n_primitives);
-    for (u32 i = 0; i < count; ++i)
-        if (AttribMap* primitive = findListItem(mesh, mesh_schema::n_primitives, i))
-            primitives_.push_back(primitive);
-}
-
-/// A list of sizes needs work even if it holds triangles alone: readers take faces of mixed size
-/// for polygons.
-bool MeshTriangulation::isNeeded() const {
-    return std::ranges::any_of(primitives_, [&](const AttribMap* primitive) {
-        const FaceSizes sizes = readPolygonSizes(*primitive);
-        return sizes.list || sizes.single > largestFace_;
-    });
-}
 
 bool MeshTriangulation::run() {
     if (!findFaceIndices() || !reserve())
@@ -222,8 +225,10 @@ bool triangulate(AttribMap& mesh, bool keepQuads, bool) {
     const auto* positions = find(mesh, mesh_schema::n_positions);
     if (!positions || positions->empty() || findIndices(mesh, mesh_schema::n_triIndices))
         return true;
-    MeshTriangulation triangulation(mesh, *positions, keepQuads ? 4 : 3);
-    return !triangulation.isNeeded() || triangulation.run();
+    const u32 largestFace = keepQuads ? 4 : 3;
+    vector<AttribMap*> primitives = findPrimitives(mesh);
+    return !needsTriangulation(primitives, largestFace) ||
+           MeshTriangulation(mesh, *positions, std::move(primitives), largestFace).run();
 }
 
 } // namespace scene
