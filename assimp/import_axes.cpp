@@ -1,5 +1,7 @@
 #include "assimp/import_axes.h"
 
+#include "b_vector_math.h"
+
 #include <assimp/scene.h>
 
 #include <cmath>
@@ -37,14 +39,6 @@ float findScale(const aiMetadata& data) {
     return std::isfinite(factor) && factor > 0 ? static_cast<float>(factor * 0.01) : 1.0f;
 }
 
-vec3f cross(const vec3f& a, const vec3f& b) {
-    return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
-}
-
-vec3f operator*(const vec3f& v, float f) {
-    return {v.x * f, v.y * f, v.z * f};
-}
-
 } // namespace
 
 SceneAxes readAxes(const aiScene& source) {
@@ -61,7 +55,7 @@ SceneAxes readAxes(const aiScene& source) {
                       findAxis(data, "FrontAxis", "FrontAxisSign")};
     // Three axes, each once; else the entries are no frame.
     const vec3f normal = cross(turn.r0, turn.r1);
-    if (normal == vec3f{} || (normal != turn.r2 && normal != turn.r2 * -1))
+    if (normal == vec3f{} || (normal != turn.r2 && normal != -turn.r2))
         return result;
 
     // The usual frames with X or Z up are left to the exporter, which knows just these.

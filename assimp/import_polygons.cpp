@@ -4,10 +4,10 @@
 #include "assimp/manifold.h"
 #include "assimp/vertex_frames.h"
 #include "assimp/vertex_selection.h"
-#include "assimp/weld.h"
 
 #include "scene_mesh_index.h"
 #include "scene_schema.h"
+#include "scene_weld.h"
 
 #include <assimp/mesh.h>
 
@@ -99,7 +99,7 @@ private:
                      vector<Ts>&... arrays) {
         if (!perCorner_)
             return;
-        Welding welding = weld(arrays...);
+        scene::Welding welding = scene::weld(arrays...);
         ((arrays = elementsAt(arrays, welding.firsts)), ...);
         channels_.push_back({&owner, &indices, std::move(welding.numbers)});
     }
@@ -169,7 +169,7 @@ void PolygonImport::settlePositions() {
         positions_ = elementsAt(positions_, selection_.vertices);
     if (!perCorner_)
         return;
-    Welding welding = weld(positions_);
+    scene::Welding welding = scene::weld(positions_);
     positions_ = elementsAt(positions_, welding.firsts);
     positionIndices_ = std::move(welding.numbers);
 }
@@ -292,7 +292,7 @@ void PolygonImport::separateVertices() {
         vector<const u32*> columns{positionIndices_.cbegin()};
         for (const ChannelIndices& channel : std::as_const(channels_))
             columns.push_back(channel.indices.data());
-        Welding welding = weldRows(columns, cornerCount);
+        scene::Welding welding = scene::weldRows(columns, cornerCount);
         vertices = std::move(welding.numbers);
         vertexCount = static_cast<u32>(welding.firsts.size());
     }

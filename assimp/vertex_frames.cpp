@@ -1,6 +1,7 @@
 #include "assimp/vertex_frames.h"
 
-#include "assimp/weld.h"
+#include "b_vector_math.h"
+#include "scene_weld.h"
 
 #include <algorithm>
 #include <cmath>
@@ -30,14 +31,6 @@ constexpr float cosineSlack = 1e-5f;
 /// in a text file leave.
 constexpr float unitTolerance = 4e-6f;
 
-template <class V>
-auto dot(const V& a, const V& b) {
-    return a.x * b.x + a.y * b.y + a.z * b.z;
-}
-template <class V>
-V cross(const V& a, const V& b) {
-    return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
-}
 vec3d difference(const vec3f& a, const vec3f& b) {
     return {double(a.x) - b.x, double(a.y) - b.y, double(a.z) - b.z};
 }
@@ -275,7 +268,7 @@ vector<vec4f> computeTangents(const Surface& surface, const vector<normal>& norm
         }
     });
 
-    const Welding groups = weld(keys);
+    const scene::Welding groups = scene::weld(keys);
     vector<vec3d> sums(groups.firsts.size());
     vec3d* sum = sums.data();
     for (u32 c = 0; c < directions.size(); ++c)

@@ -1,5 +1,6 @@
 #include "polygons.h"
 
+#include "b_vector_math.h"
 #include "support/scene_builder.h"
 
 #include <cmath>
@@ -89,32 +90,20 @@ Points makeOutline(Random& random) {
     }
 }
 
-double dot(const vec3d& a, const vec3d& b) {
-    return a.x * b.x + a.y * b.y + a.z * b.z;
-}
-
-vec3d scaled(const vec3d& a, double factor) {
-    return {a.x * factor, a.y * factor, a.z * factor};
-}
-
-vec3d sum(const vec3d& a, const vec3d& b) {
-    return {a.x + b.x, a.y + b.y, a.z + b.z};
-}
-
 /// A plane in any position: its origin and two directions.
 struct Plane {
     explicit Plane(Random& random)
         : origin(anywhere(random, 50)), u(anywhere(random, 1)), v(anywhere(random, 1)) {
-        u = scaled(u, 1 / std::sqrt(dot(u, u)));
-        v = sum(v, scaled(u, -dot(u, v)));
-        v = scaled(v, 1 / std::sqrt(dot(v, v)));
+        u = u * (1 / length(u));
+        v = v - u * dot(u, v);
+        v = v * (1 / length(v));
     }
     vec3f place(const vec2d& p) const {
-        const vec3d at = sum(origin, sum(scaled(u, p.x), scaled(v, p.y)));
+        const vec3d at = origin + u * p.x + v * p.y;
         return {static_cast<float>(at.x), static_cast<float>(at.y), static_cast<float>(at.z)};
     }
     vec2d project(const vec3f& p) const {
-        const vec3d way = sum({p.x, p.y, p.z}, scaled(origin, -1));
+        const vec3d way = vec3d{p.x, p.y, p.z} - origin;
         return {dot(way, u), dot(way, v)};
     }
 

@@ -1,5 +1,6 @@
 #include "scene.h"
 
+#include "scene_matrix.h"
 #include "scene_mesh.h"
 #include "scene_transform.h"
 
@@ -7,8 +8,6 @@
 #include "b_log.h"
 
 #include <algorithm>
-#include <cmath>
-#include <limits>
 
 namespace scene {
 
@@ -30,16 +29,6 @@ const base::Attribute* findPathEnd(const base::AttribPath& path) {
             at = at->asArray() ? at->asArray()->item(step.index) : nullptr;
     }
     return at;
-}
-
-bool fitsFloats(const base::vec3d& v) {
-    constexpr double limit = std::numeric_limits<float>::max();
-    return std::abs(v.x) <= limit && std::abs(v.y) <= limit && std::abs(v.z) <= limit;
-}
-bool fitsFloats(const base::mat43& matrix) {
-    const auto& [m, t] = matrix;
-    return fitsFloats(widened(m.r0)) && fitsFloats(widened(m.r1)) && fitsFloats(widened(m.r2)) &&
-           fitsFloats(t);
 }
 
 } // namespace
@@ -120,7 +109,7 @@ base::u32 INode::getTransform(base::mat43& transform, const base::mat43* parentW
         return faults;
     base::mat43 undo, freed;
     if (!parentWorld || !invert(*parentWorld, undo) ||
-        !fitsFloats(freed = multiply(undo, transform)))
+        !fitsFloat(freed = multiply(undo, transform)))
         return faults | faultParent;
     transform = freed;
     return faults;

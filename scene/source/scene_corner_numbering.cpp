@@ -1,11 +1,11 @@
 #include "scene_corner_numbering.h"
 
 #include "b_log.h"
+#include "scene_weld.h"
 
 #include <algorithm>
 #include <array>
 #include <bit>
-#include <numeric>
 #include <utility>
 
 namespace scene {
@@ -21,11 +21,6 @@ constexpr u32 none = 0xffffffff;
 constexpr u32 longestChain = 64;
 /// Corners between two reports, and the least number of corners that is worth one.
 constexpr u32 reportInterval = 100000;
-
-u64 mix(u64 hash, u64 word) {
-    hash = (hash ^ word) * 0x9e3779b97f4a7c15u;
-    return hash ^ (hash >> 32);
-}
 
 /// The vertices made so far, chained by bucket. As long as that does, the buckets are the entries
 /// of the first column: neighbouring faces then touch neighbouring memory, which no scattering
@@ -81,7 +76,7 @@ private:
     u32 hashBucket(u32 corner) const {
         u64 hash = 0;
         for (const u32* column : columns_)
-            hash = mix(hash, column[corner]);
+            hash = mixHash(hash, column[corner]);
         return static_cast<u32>(hash) & (static_cast<u32>(heads_.size()) - 1);
     }
 
@@ -125,91 +120,34 @@ CornerNumbering numberCorners(std::span<const u32* const> columns, u32 cornerCou
 namespace {
 
 template <std::size_t WordCount>
-using Element = std::array<u32, WordCount>;
-
-/// Open addressing over the bytes of elements. The slots are asked for some elements ahead, since
-/// nearly each lies in memory that is not at hand.
-template <std::size_t WordCount>
-class ElementTable {
-public:
-    ElementTable(const Element<WordCount>* elements, u32 count)
-        : elements_(elements), count_(count),
-          slots_(std::bit_ceil(2 * (std::size_t(count) + 1)), none) {}
-
-    base::vector<u32> findFirst() {
-        base::vector<u32> first; // made at the first repetition
-        std::array<u64, ahead> hashes{};
-        u32* slots = slots_.data();
-        const std::size_t mask = slots_.size() - 1;
-        for (u64 i = 0; i < count_ + u64(1) + ahead; ++i) {
-            if (i >= ahead) {
-                const u32 index = static_cast<u32>(i - ahead);
-                const u32 found = findOrAdd(index, hashes[i % ahead], slots, mask);
-                if (found != index && first.empty())
-                    first = identity(index);
-                if (!first.empty())
-                    first.data()[index] = found;
-            }
-            if (i <= count_) {
-                hashes[i % ahead] = hashOf(at(static_cast<u32>(i)));
-                __builtin_prefetch(slots + (hashes[i % ahead] & mask), 1);
-            }
-        }
-        return first;
-    }
-
-private:
-    static constexpr u64 ahead = 16;
-
-    Element<WordCount> at(u32 i) const { return i < count_ ? elements_[i] : Element<WordCount>{}; }
-
-    static u64 hashOf(const Element<WordCount>& element) {
+base::vector<u32> numberEqualOf(const void* elements, u32 count) {
+    using Element = std::array<u32, WordCount>;
+    const auto at = [all = static_cast<const Element*>(elements), count](u32 i) {
+        return i < count ? all[i] : Element{};
+    };
+    const auto hashOf = [&](u32 i) {
         u64 hash = 0;
-        for (const u32 word : element)
-            hash = mix(hash, word);
+        for (const u32 word : at(i))
+            hash = mixHash(hash, word);
         return hash;
-    }
-
-    u32 findOrAdd(u32 index, u64 hash, u32* slots, std::size_t mask) const {
-        const Element<WordCount> element = at(index);
-        std::size_t slot = hash & mask;
-        while (slots[slot] != none) {
-            if (at(slots[slot]) == element)
-                return slots[slot];
-            slot = (slot + 1) & mask;
-        }
-        return slots[slot] = index;
-    }
-
-    base::vector<u32> identity(u32 filled) const {
-        base::vector<u32> result;
-        result.resizeUninitialized(std::size_t(count_) + 1);
-        std::iota(result.data(), result.data() + filled, 0u);
-        return result;
-    }
-
-    const Element<WordCount>* elements_;
-    u32 count_;
-    base::vector<u32> slots_;
-};
-
-template <std::size_t WordCount>
-base::vector<u32> findFirstEqualOf(const void* elements, u32 count) {
-    return ElementTable(static_cast<const Element<WordCount>*>(elements), count).findFirst();
+    };
+    const auto areEqual = [&](u32 i, u32 j) { return at(i) == at(j); };
+    Welding welding = Welder(count + 1, hashOf, areEqual).run();
+    return welding.firsts.size() <= count ? std::move(welding.numbers) : base::vector<u32>();
 }
 
 } // namespace
 
-base::vector<u32> findFirstEqual(const void* elements, u32 wordCount, u32 count) {
+base::vector<u32> numberEqual(const void* elements, u32 wordCount, u32 count) {
     switch (wordCount) {
     case 1:
-        return findFirstEqualOf<1>(elements, count);
+        return numberEqualOf<1>(elements, count);
     case 2:
-        return findFirstEqualOf<2>(elements, count);
+        return numberEqualOf<2>(elements, count);
     case 3:
-        return findFirstEqualOf<3>(elements, count);
+        return numberEqualOf<3>(elements, count);
     default:
-        return findFirstEqualOf<4>(elements, count);
+        return numberEqualOf<4>(elements, count);
     }
 }
 

@@ -21,9 +21,9 @@ struct CornerNumbering {
 CornerNumbering numberCorners(std::span<const base::u32* const> columns, base::u32 cornerCount,
                               base::u32 firstColumnBound, const base::string& name);
 
-/// For each of `count` elements of `wordCount` (1 to 4) 32-bit words the index of the first
-/// element with the same bytes. One more entry answers for the element of zeros, whose own index
-/// is `count`. Empty if no two elements are equal and none is zero.
-base::vector<base::u32> findFirstEqual(const void* elements, base::u32 wordCount, base::u32 count);
+/// Numbers `count` elements of `wordCount` (1 to 4) 32-bit words by their bytes, from 0 in the
+/// order of first appearance. One more entry answers for the element of zeros. Empty if no two
+/// elements are equal and none is zero.
+base::vector<base::u32> numberEqual(const void* elements, base::u32 wordCount, base::u32 count);
 
 } // namespace scene

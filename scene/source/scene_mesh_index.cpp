@@ -197,18 +197,18 @@ void SingleIndexConversion::makeTupleColumns() {
             columns_.push_back(channel.indexOfCorner);
 }
 
-/// Entries that are equal exactly if the corners address equal bytes: the first equal element of
-/// what each corner addresses. Empty if the indices themselves are such.
+/// Entries that are equal exactly if the corners address equal bytes. Empty if the indices
+/// themselves are such.
 vector<u32> makeValueColumn(const Channel& channel, u32 cornerCount) {
-    const vector<u32> first = findFirstEqual(channel.data, channel.wordCount, channel.count);
+    const vector<u32> numbers = numberEqual(channel.data, channel.wordCount, channel.count);
     vector<u32> column;
-    if (first.empty() && channel.indexOfCorner && channel.coversAll(cornerCount))
+    if (numbers.empty() && channel.indexOfCorner && channel.coversAll(cornerCount))
         return column;
     column.resizeUninitialized(cornerCount);
     u32* out = column.data();
     for (u32 c = 0; c < cornerCount; ++c) {
         const u32 index = channel.covers(channel.index(c)) ? channel.index(c) : channel.count;
-        out[c] = first.empty() ? index : first[index];
+        out[c] = numbers.empty() ? index : numbers[index];
     }
     return column;
 }

@@ -1,5 +1,7 @@
 #include "scene_plane.h"
 
+#include "b_vector_math.h"
+
 #include <algorithm>
 #include <array>
 #include <cfloat>
@@ -20,22 +22,6 @@ constexpr double contact = 1e-12;
 
 vec3d subtract(const vec3f& a, const vec3f& b) {
     return {double(a.x) - b.x, double(a.y) - b.y, double(a.z) - b.z};
-}
-
-vec3d cross(const vec3d& a, const vec3d& b) {
-    return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
-}
-
-double dot(const vec3d& a, const vec3d& b) {
-    return a.x * b.x + a.y * b.y + a.z * b.z;
-}
-
-double length(const vec3d& v) {
-    return std::sqrt(dot(v, v));
-}
-
-vec3d scaled(const vec3d& v, double factor) {
-    return {v.x * factor, v.y * factor, v.z * factor};
 }
 
 /// The cross product of the way to the farthest corner with the way to the one that lies farthest
@@ -85,7 +71,7 @@ std::optional<PolygonPlane> findPlane(const base::vector<vec3f>& positions,
     const double size = length(sum);
     if (!(size > rounding))
         return std::nullopt;
-    return PolygonPlane{scaled(sum, 1 / size), precision};
+    return PolygonPlane{sum * (1 / size), precision};
 }
 
 void projectPolygon(const base::vector<vec3f>& positions, std::span<const u32> corners,
@@ -99,7 +85,7 @@ void projectPolygon(const base::vector<vec3f>& positions, std::span<const u32> c
     else if (magnitude.z < magnitude.x)
         axis = {0, 0, 1};
     vec3d v = cross(normal, axis);
-    v = scaled(v, 1 / length(v));
+    v = v * (1 / length(v));
     const vec3d u = cross(v, normal);
 
     const vec3f origin = positions[corners[0]];

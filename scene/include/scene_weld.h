@@ -7,7 +7,7 @@
 #include <cstring>
 #include <utility>
 
-namespace assimp {
+namespace scene {
 
 /// Which elements of an array are equal.
 struct Welding {
@@ -137,4 +137,4 @@ Welding weld(const base::vector<T>& first, const base::vector<U>& second) {
     return weldRows({a.numbers.data(), b.numbers.data()}, static_cast<base::u32>(first.size()));
 }
 
-} // namespace assimp
+} // namespace scene
