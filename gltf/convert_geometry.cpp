@@ -1,4 +1,5 @@
 #include "gltf/exporter.h"
+#include "gltf/mesh_indices.h"
 #include "gltf/vertex_array.h"
 
 #include "b_log.h"
@@ -8,7 +9,6 @@
 #include "scene_schema.h"
 
 #include <algorithm>
-#include <numeric>
 
 namespace gltf {
 
@@ -23,34 +23,6 @@ using base::u32;
 using base::u64;
 using scene::mesh_schema;
 using scene::meshPrimitive_schema;
-
-/// The index array that the primitives of a mesh share; a mesh may have none.
-class MeshIndices {
-public:
-    explicit MeshIndices(const scene::IMesh& mesh);
-
-    const u32* data() const { return data_; }
-    u64 count() const { return count_; }
-    u32 vertexCount() const { return vertexCount_; }
-    bool isTriangulated() const { return isTriangulated_; }
-    /// Entries that ranges may address: without an array, the vertices in their order.
-    u64 rangeEnd() const { return data_ ? count_ : vertexCount_; }
-
-    /// Makes the array that lists all vertices in their order.
-    void number();
-    /// A view of the whole array, which the document borrows if it lasts, else copies.
-    ref<GLTF::BufferView> makeView(const scene::IMesh& mesh) const;
-    /// Position of the first index in the array that leads past the vertices; `count` if none does.
-    u64 findOutOfRange() const;
-
-private:
-    const u32* data_ = nullptr;
-    u64 count_ = 0;
-    u32 vertexCount_ = 0;
-    bool isTriangulated_ = false;
-    bool mustCopy_ = false;
-    base::vector<u32> own_;
-};
 
 namespace {
 
@@ -139,49 +111,6 @@ u32 countPrimitives(const scene::IMesh& mesh) {
         count += findListItem(mesh, mesh_schema::n_primitives, i) != nullptr;
     return count;
 }
-
-} // namespace
-
-MeshIndices::MeshIndices(const scene::IMesh& mesh) {
-    const auto use = [&](const scene::SchemaAttribute<base::vector<u32>>& name) {
-        const auto* array = find(mesh, name);
-        if (!array || array->empty())
-            return false;
-        data_ = array->data();
-        count_ = array->size();
-        mustCopy_ = !mayBorrow(mesh, name);
-        return true;
-    };
-    isTriangulated_ = use(mesh_schema::n_triIndices);
-    // Only a mesh that could not be converted to single indices has position indices still.
-    if (!isTriangulated_ && !use(mesh_schema::n_indices))
-        use(mesh_schema::n_positionIndices);
-    if (const auto* positions = find(mesh, mesh_schema::n_positions))
-        vertexCount_ = static_cast<u32>(positions->size());
-}
-
-void MeshIndices::number() {
-    own_.resizeUninitialized(vertexCount_);
-    std::iota(own_.begin(), own_.end(), 0u);
-    data_ = std::as_const(own_).data();
-    count_ = own_.size();
-    mustCopy_ = true;
-}
-
-ref<GLTF::BufferView> MeshIndices::makeView(const scene::IMesh& mesh) const {
-    if (!data_)
-        return nullptr;
-    return base::makeRef<GLTF::BufferView>(data_, checkedLength(count_ * sizeof(u32), mesh),
-                                           GLTF::BufferView::elementArrayBuffer, mustCopy_);
-}
-
-u64 MeshIndices::findOutOfRange() const {
-    const u32 end = vertexCount_;
-    return static_cast<u64>(
-        std::find_if(data_, data_ + count_, [end](u32 index) { return index >= end; }) - data_);
-}
-
-namespace {
 
 /// True if an index leads past the vertices.
 bool hasIndexOutOfRange(const GLTF::Mesh& gltfMesh, const MeshIndices& indices) {

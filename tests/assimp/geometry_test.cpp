@@ -6,16 +6,8 @@
 namespace {
 
 using namespace scene;
-using base::u16;
-using base::u32;
-using base::vec2f;
-using base::vec3f;
-using base::vec4f;
-using base::vector;
-using test_support::cornersOf;
-using test_support::Import;
-using test_support::LogCapture;
-using test_support::valuesOf;
+using namespace test_support;
+using namespace base;
 
 class Geometry : public Import {
 protected:

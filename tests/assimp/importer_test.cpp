@@ -58,6 +58,7 @@ TEST_F(Importer, FilesThatCannotBeReadGiveOneErrorAndNothingElse) {
         {"cut.dae", "<COLLADA"},
         {"cut.fbx", string("Kaydara FBX Binary  \0\x1a\0\xff\x1c\0\0", 27)},
         {"text.ply", "This is no model, but some text that is long enough for a header."},
+        {"cut.ply", "ply\nformat ascii 1.0\ncomment end_header\nelement vertex 3\nprop"},
         {"old.fbx", "; FBX 6.1.0 project file\nFBXHeaderExtension:  {\nFBXVersion: 6100\n}\n"},
         {"text.3ds", "This is no model."}};
     for (const auto& c : cases) {

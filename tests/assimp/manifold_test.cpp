@@ -8,8 +8,7 @@
 namespace {
 
 using namespace scene;
-using base::u32;
-using base::vector;
+using namespace base;
 
 /// A surface that touches itself.
 struct Case {
@@ -43,10 +42,6 @@ const Case cases[] = {
      {9, 3},
      {{0, 0, 0}, {1, 0, 0}, {0, 1, 0}},
      {{0, 1, 2}, {0, 1, 2}, {2, 1, 0}}},
-    {"two sides of a rhombus",
-     {8, 4},
-     {{0, 0, 0}, {2, 0.5f, 0}, {0, 1, 0}, {-2, 0.5f, 0}},
-     {{0, 1, 2, 3}, {3, 2, 1, 0}}},
     // Its third square has the first side of the first one in the same direction.
     {"Moebius strip",
      {8, 6},
@@ -70,8 +65,7 @@ const Case cases[] = {
     {"corner without a triangle",
      {4, 2},
      {{0, 0, 0}, {2, 0, 0}, {2, 2, 0}, {2, 3, 0}, {0, 2, 0}},
-     {{0, 1, 2, 3, 2, 4}}},
-};
+     {{0, 1, 2, 3, 2, 4}}}};
 
 /// In OBJ, with `suffix` at each corner; without one in OFF, where faces share vertices.
 std::string textOf(const Case& c, const char* suffix) {

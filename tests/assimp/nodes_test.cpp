@@ -4,11 +4,8 @@
 namespace {
 
 using namespace scene;
-using base::mat43;
-using base::vec3d;
-using base::vec3f;
-using test_support::FbxText;
-using test_support::Import;
+using namespace test_support;
+using namespace base;
 
 vec3d transformed(const mat43& m, const vec3d& p) {
     const auto row = [&](const vec3f& r) { return r.x * p.x + r.y * p.y + r.z * p.z; };
@@ -77,18 +74,16 @@ TEST_F(Nodes, TreeNamesAndSharedMeshes) {
     EXPECT_EQ(mesh().getName(), "Plate");
     EXPECT_EQ(only(scene_schema::n_kind).getName(), "plates");
 
+    // Unit and axis of the file are in the root, and nowhere else.
+    expectNear(transformed(transformOf(root()), {1, 2, 3}), {0.0254, 3 * 0.0254, -2 * 0.0254});
+    EXPECT_EQ(read(only(scene_schema::n_kind), scene_schema::n_upAxis), 1);
+
     // A mirrored node as the file has it, without a rotation.
     const auto nodes = objects(node_schema::n_kind);
     EXPECT_EQ(read(*nodes[1], node_schema::n_scale), (vec3f{-2, 3, 4}));
     EXPECT_EQ(read(*nodes[1], node_schema::n_translate), (vec3d{1, 2, 3}));
     EXPECT_FALSE(nodes[1]->findAttribute(node_schema::n_rotate));
     expectNear(transformed(transformOf(*nodes[3]), {1, 1, 0}), {-1, 2, 0});
-}
-
-TEST_F(Nodes, ColladaUnitAndAxisAreInTheRootOnce) {
-    ASSERT_TRUE(load("plates.dae", collada));
-    expectNear(transformed(transformOf(root()), {1, 2, 3}), {0.0254, 3 * 0.0254, -2 * 0.0254});
-    EXPECT_EQ(read(only(scene_schema::n_kind), scene_schema::n_upAxis), 1);
 }
 
 /// What an exporter does with the root of a scene whose up axis is not Y.
@@ -101,23 +96,21 @@ TEST_F(Nodes, FbxUnitAndAxesAreInTheSceneOnce) {
         FbxText fbx;
         double metres;
         base::u8 upAxis;
-    } cases[] = {
-        {{1, 1, 2, 1, 0, 1, "1", "", ""}, 0.01, 1},
-        {{1, 1, 2, 1, 0, 1, "100", "", ""}, 1, 1},
-        {{2, 1, 1, -1, 0, 1, "2.54", "", ""}, 0.0254, 2},
-        {{0, 1, 2, 1, 1, -1, "1", "", ""}, 0.01, 0},
-        {{2, 1, 0, 1, 1, 1, "1", "", ""}, 0.01, 1},
-        {{1, -1, 2, 1, 0, -1, "1", "", ""}, 0.01, 1},
-        {{2, 1, 1, 1, 0, 1, "100", "", ""}, 1, 1},
-    };
+    } cases[] = {{{1, 1, 2, 1, 0, 1, "1", "", ""}, 0.01, 1},
+                 {{1, 1, 2, 1, 0, 1, "100", "", ""}, 1, 1},
+                 {{2, 1, 1, -1, 0, 1, "2.54", "", ""}, 0.0254, 2},
+                 {{0, 1, 2, 1, 1, -1, "1", "", ""}, 0.01, 0},
+                 {{2, 1, 0, 1, 1, 1, "1", "", ""}, 0.01, 1},
+                 {{1, -1, 2, 1, 0, -1, "1", "", ""}, 0.01, 1},
+                 {{2, 1, 1, 1, 0, 1, "100", "", ""}, 1, 1}};
     for (const auto& c : cases) {
         SCOPED_TRACE(&c - cases);
         ASSERT_TRUE(load("axes.fbx", c.fbx.text()));
         const base::u8 upAxis = read(only(scene_schema::n_kind), scene_schema::n_upAxis);
         EXPECT_EQ(upAxis, c.upAxis);
         const auto along = [&](int axis, int sign) {
-            const double v[3] = {axis == 0 ? sign : 0.0, axis == 1 ? sign : 0.0,
-                                 axis == 2 ? sign : 0.0};
+            double v[3] = {};
+            v[axis] = sign;
             return turnedUp(upAxis, transformed(transformOf(root()), {v[0], v[1], v[2]}));
         };
         expectNear(along(c.fbx.right, c.fbx.rightSign), {c.metres, 0, 0});

@@ -6,14 +6,8 @@
 namespace {
 
 using namespace scene;
-using base::normal;
-using base::u32;
-using base::vec3f;
-using base::vec4f;
-using base::vector;
-using test_support::cornersOf;
-using test_support::Import;
-using test_support::LogCapture;
+using namespace test_support;
+using namespace base;
 
 class Normals : public Import {
 protected:
@@ -66,14 +60,8 @@ TEST_F(Normals, AreSmoothUpToTheAngle) {
         ASSERT_TRUE(load("hinge.off", hinge));
         const vector<normal> found = normals();
         ASSERT_EQ(found.size(), 8u);
-        const vec3f wanted[8] = {c.isSmooth ? mean : up,
-                                 up,
-                                 up,
-                                 c.isSmooth ? mean : up,
-                                 c.isSmooth ? mean : slope,
-                                 c.isSmooth ? mean : slope,
-                                 slope,
-                                 slope};
+        const auto at = [&](const vec3f& flat) { return c.isSmooth ? mean : flat; };
+        const vec3f wanted[8] = {at(up), up, up, at(up), at(slope), at(slope), slope, slope};
         for (u32 i = 0; i < 8; ++i)
             expectNear(found[i], wanted[i]);
         // Corners of one vertex must weld again.
@@ -154,13 +142,11 @@ TEST_F(Normals, TangentsFollowTheTexture) {
     const struct {
         int a, b, c, d;
         vec4f tangent;
-    } cases[] = {
-        {1, 0, 0, 1, {1, 0, 0, 1}},
-        {-1, 0, 0, 1, {-1, 0, 0, -1}},
-        {0, 1, -1, 0, {0, 1, 0, 1}},
-        {1, 0, 0, -1, {1, 0, 0, -1}}, // Along u where v stays, which is not across v.
-        {3, 0, 1, 2, {0.894427f, -0.447214f, 0, 1}},
-    };
+    } cases[] = {{1, 0, 0, 1, {1, 0, 0, 1}},
+                 {-1, 0, 0, 1, {-1, 0, 0, -1}},
+                 {0, 1, -1, 0, {0, 1, 0, 1}},
+                 {1, 0, 0, -1, {1, 0, 0, -1}}, // Along u where v stays, which is not across v.
+                 {3, 0, 1, 2, {0.894427f, -0.447214f, 0, 1}}};
     for (const auto& c : cases) {
         ASSERT_TRUE(load("square.obj", square(c.a, c.b, c.c, c.d)));
         ASSERT_EQ(tangents().size(), 4u);
