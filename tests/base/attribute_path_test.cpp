@@ -9,7 +9,7 @@
 namespace base {
 namespace {
 
-using test_support::LogCapture;
+using namespace test_support;
 
 name_id named(string_view text) {
     return nameServer().id(text);
@@ -53,8 +53,8 @@ protected:
         return *made;
     }
     string brokenText(string_view name, string_view value) const {
-        return format("map attribute| Detected invalid link attribute! Cannot resolve '{}' with "
-                      "value '{}'!",
+        return format("3 map attribute| Detected invalid link attribute! Cannot resolve '{}' with "
+                      "value '{}'!\n",
                       name, value);
     }
 
@@ -99,12 +99,10 @@ TEST_F(AttribPathTest, EqualityIsByStepsAndRoot) {
     EXPECT_FALSE(x == AttribPath(*a));
     EXPECT_FALSE(AttribPath(x).element(1) == AttribPath(x).element(2));
     EXPECT_FALSE(AttribPath(x).element(1) == AttribPath(x).component(1));
-
     AttribLink one(x), two;
     EXPECT_FALSE(two.assign(one, assignMerge));
     EXPECT_TRUE(two.assign(one, assignCopy));
     EXPECT_EQ(one.compare(two.data()), 0);
-    EXPECT_EQ(two.byteSize(), 12u);
 }
 
 TEST_F(AttribPathTest, SurvivesItsTargetAndNotItsRoot) {
@@ -173,11 +171,9 @@ TEST_F(AttribPathTest, BrokenLinksAreReportedOnceAnAccess) {
     EXPECT_EQ(a->findAttribute<i32>(named("outer")), nullptr);
     link(*a, "empty", {});
     EXPECT_EQ(a->findAttribute(named("empty")), nullptr);
-    const vector<LogCapture::Entry> expected = {
-        {logSystem, logWarning, brokenText("outer", "Plugin[0].x")},
-        {logSystem, logWarning, brokenText("outer", "Plugin[0].x")},
-        {logSystem, logWarning, brokenText("empty", "")}};
-    EXPECT_EQ(log.take(), expected);
+    EXPECT_EQ(linesOf(log), brokenText("outer", "Plugin[0].x") +
+                                brokenText("outer", "Plugin[0].x") + brokenText("empty", ""));
+    log.take();
     inner.setFlags(attribSilentLink);
     EXPECT_EQ(a->findAttribute(named("outer")), nullptr);
     EXPECT_TRUE(a->findAttribute(named("outer"), false)->asLink());
@@ -223,7 +219,7 @@ TEST_F(AttribPathTest, AnEvaluationThatNeedsItselfIsNotAskedAgain) {
     link(*a, "x", AttribPath(*layer, named("outputs")).element(0));
     EXPECT_EQ(*a->findAttribute<i32>(named("x")), 1);
     EXPECT_EQ(layer->modes, vector<u32>{0});
-    EXPECT_TRUE(log.has(logWarning, brokenText("back", "Plugin[2].outputs[1]")));
+    EXPECT_EQ(linesOf(log), brokenText("back", "Plugin[2].outputs[1]"));
 }
 
 TEST_F(AttribPathTest, ChangesAreToldByMode) {

@@ -1,24 +1,11 @@
 #include "b_exception.h"
 
 #include "b_log.h"
-#include "stream/b_fs.h"
 
-#include <cerrno>
-#include <functional>
 #include <gtest/gtest.h>
 
 namespace base {
 namespace {
-
-/// Throws and catches by `std::exception`, as guards do that do not know the family.
-string caughtText(const std::function<void()>& raise) {
-    try {
-        raise();
-    } catch (const std::exception& error) {
-        return error.what();
-    }
-    return "nothing thrown";
-}
 
 vector<string> reported(const exception& error) {
     const ref<Log> log = makeRef<Log>();
@@ -29,21 +16,6 @@ vector<string> reported(const exception& error) {
         lines.push_back(entry.text);
     }
     return lines;
-}
-
-TEST(Exception, HasTheTextsOfItsKinds) {
-    const std::pair<std::function<void()>, string_view> rows[] = {
-        {[] { throw exception("plain"); }, "plain"},
-        {[] { throw api_exception("denied", EACCES); }, "denied"},
-        {[] { throw invalid_argument("bad"); }, "bad"},
-        {[] { throw wrong_password("secret"); }, "secret"},
-        {[] { throw switch_exception(); }, "Unhandled case in switch statement."},
-        {[] { throw string_conversion_exception(); }, "Invalid string conversion"},
-        {[] { throw unsupported_interface(); }, "Unsupported interface."},
-        {[] { throw fs::file_not_found("a/b"); }, "File 'a/b' cannot be found!"},
-    };
-    for (const auto& [raise, text] : rows)
-        EXPECT_EQ(caughtText(raise), text);
 }
 
 TEST(Exception, ReportsItself) {

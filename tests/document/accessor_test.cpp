@@ -15,18 +15,16 @@ TEST(Accessors, ReadAndWriteEveryComponentType) {
         i32 componentType;
         i32 byteLength;
         float wanted, stored; // the value after a write and a read
-    } rows[] = {
-        {componentI8, 1, -128.9f, -128},
-        {componentI8, 1, 500, 127},
-        {componentU8, 1, -3, 0},
-        {componentU8, 1, 255.9f, 255},
-        {componentI16, 2, -40000, -32768},
-        {componentU16, 2, 65535, 65535},
-        {componentU32, 4, 5e9f, 4294967296.0f},
-        {componentU32, 4, 16777215, 16777215},
-        {componentU32, 4, NAN, 0},
-        {componentFloat, 4, -1.5f, -1.5f},
-    };
+    } rows[] = {{componentI8, 1, -128.9f, -128},
+                {componentI8, 1, 500, 127},
+                {componentU8, 1, -3, 0},
+                {componentU8, 1, 255.9f, 255},
+                {componentI16, 2, -40000, -32768},
+                {componentU16, 2, 65535, 65535},
+                {componentU32, 4, 5e9f, 4294967296.0f},
+                {componentU32, 4, 16777215, 16777215},
+                {componentU32, 4, NAN, 0},
+                {componentFloat, 4, -1.5f, -1.5f}};
     for (const auto& row : rows) {
         EXPECT_EQ(Accessor::componentByteLength(row.componentType), row.byteLength);
         const auto view = viewOf(std::vector<u8>(64, 0xcd));
@@ -53,7 +51,6 @@ TEST(Accessors, TolerateWhatIsNotThere) {
     EXPECT_EQ(unknown.getByteStride(), 0);
     Accessor noType(static_cast<Type>(7), componentFloat);
     EXPECT_TRUE(noType.getComponentsAtIndex(0, values));
-    EXPECT_STREQ(Accessor::typeText(noType.type), "");
 
     // Three of four elements lie in the buffer, the third only with its first component.
     Accessor cut(Type::vec2, componentU16, 2, 4, viewOf(std::vector<base::u16>{9, 1, 2, 3, 4, 5}));
@@ -158,8 +155,7 @@ TEST(Buffers, WriteTheirUriByTheOptions) {
         {true, false, R"({"byteLength":3,"uri":"data:application/octet-stream;base64,TWFu"})"},
         {true, true, R"({"byteLength":3})"},
         {false, false, R"({"byteLength":3,"uri":"s\"2.bin"})"},
-        {false, true, R"({"byteLength":3,"uri":"s\"2.bin"})"},
-    };
+        {false, true, R"({"byteLength":3,"uri":"s\"2.bin"})"}};
     for (const auto& row : rows) {
         Options options;
         options.name = "s\"";

@@ -71,8 +71,7 @@ TEST(Materials, WriteTheirMembersByTheirRules) {
          },
          R"({"pbrMetallicRoughness":{},"extensions":{"KHR_materials_pbrSpecularGlossiness":)"
          R"({"diffuseFactor":[0,0,0,0],"diffuseTexture":{"index":3},"specularFactor":[1.0,1.0,0],)"
-         R"("glossinessFactor":0,"specularGlossinessTexture":{"index":4}}},"alphaMode":"OPAQUE"})"},
-    };
+         R"("glossinessFactor":0,"specularGlossinessTexture":{"index":4}}},"alphaMode":"OPAQUE"})"}};
     for (const auto& row : table) {
         MaterialPBR material;
         Options options;
@@ -95,8 +94,7 @@ TEST(Lights, WriteAnObjectUnderTheirOwnWord) {
         {Type::spot, R"({"type":"spot","spot":{"constantAttenuation":1.0,"linearAttenuation":2.0,)"
                      R"("quadraticAttenuation":3.0,"fallOffAngle":4.0,"fallOffExponent":5.0,)"
                      R"("color":[1.0,0.5,0]}})"},
-        {Type::unknown, "{}"},
-    };
+        {Type::unknown, "{}"}};
     for (const auto& row : table) {
         MaterialCommon::Light light;
         light.type = row.type;

@@ -174,8 +174,6 @@ TEST(Assets, MakeTheirDefaultSceneAtFirstUse) {
 
 TEST(Animations, AreMergedIntoOneWithoutAName) {
     Asset asset;
-    asset.mergeAnimations();
-    EXPECT_TRUE(asset.animations.empty());
     vector<ref<Animation::Channel>> channels;
     for (const std::size_t count : {2u, 0u, 1u}) {
         asset.animations.push_back(makeRef<Animation>());

@@ -57,13 +57,4 @@ struct Exporting : SceneBuilder {
     base::AttribMap settings;
 };
 
-/// The messages of level 3 and below as lines, each with its level in front.
-inline std::string problems(const LogCapture& log) {
-    std::string text;
-    for (const LogCapture::Entry& entry : log.entries())
-        if (entry.level <= base::logWarning)
-            text += base::format("{} {}\n", entry.level, entry.text);
-    return text;
-}
-
 } // namespace test_support

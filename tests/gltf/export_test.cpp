@@ -80,8 +80,7 @@ TEST(Settings, HaveTheEffectsThatTheyName) {
         {Settings::n_exportBinary, {}},
         {Settings::n_exportCompress, {"Draco"}},
         {Settings::n_exportCompressImages, {}},
-        {Settings::n_exportEmbedded, {"side file"}},
-    };
+        {Settings::n_exportEmbedded, {"side file"}}};
     const Exported standard = exportWith(Settings::n_exportCompress, true);
     EXPECT_EQ(standard.features, (Features{"mesh", "lines", "POSITION", "NORMAL", "TANGENT",
                                            "TEXCOORD_0", "COLOR_0", "Draco"}));
@@ -107,24 +106,6 @@ TEST(Settings, OfTheWrongTypeEndTheExport) {
     // Nothing is left behind that would trouble the next one.
     scene.settings.removeAttribute(Settings::n_exportEdges);
     EXPECT_TRUE(scene.save(scene.folder / "a.glb"));
-}
-
-TEST(Plugin, FillsTheDefaultsOfItsSettings) {
-    scene::SceneFactory factory;
-    gltf::registerPlugin(factory);
-    gltf::registerPlugin(factory); // once more changes nothing
-    base::AttribMap parameters;
-    EXPECT_FALSE(factory.getImporterParameters("a.gltf", parameters));
-    ASSERT_TRUE(factory.getExporterParameters("a.b.GLTF", parameters));
-    EXPECT_EQ(parameters.typeName().view(), "sceneExporter");
-    EXPECT_EQ(parameters.size(), 14u);
-    size_t enabled = 0;
-    for (const auto& [name, attribute] : parameters.entries())
-        enabled += attribute->toString() == "true";
-    EXPECT_EQ(enabled, 11u);
-    EXPECT_FALSE(parameters.attribute<bool>(Settings::n_exportEdges));
-    EXPECT_EQ(parameters.attribute<base::u32>(Settings::n_exportImageMaxDim), 4096u);
-    EXPECT_EQ(parameters.attribute<base::string>(Settings::n_exportCopyright), "");
 }
 
 TEST(Plugin, WorksAsALoadedModule) {
@@ -167,10 +148,11 @@ TEST(Scene, GivesTheSameBytesAgain) {
     write(buffer, buffer_schema::n_data) = {bytes, bytes + sizeof corners};
     auto& adapter = scene.add<scene::IBufferAdapter>();
     write(adapter, bufferAdapter_schema::n_inputBuffer) = scene::Object(&buffer);
-    write(adapter, bufferAdapter_schema::n_outputFloat3);
+    const base::name_id output = bufferAdapter_schema::n_outputFloat3;
+    adapter.vecAttribute<base::vec3f>(output);
     IMesh& mesh = scene.addTo<IMesh>(*scene.root, "polygons");
-    mesh.attribute(mesh_schema::n_positions, new base::AttribLink(base::AttribPath(
-                                                 adapter, bufferAdapter_schema::n_outputFloat3)));
+    mesh.attribute(mesh_schema::n_positions,
+                   new base::AttribLink(base::AttribPath(adapter, output)));
     write(mesh, mesh_schema::n_positionIndices) = {0, 1, 2, 3};
     write(mesh, mesh_schema::n_normalIndices) = {0, 0, 0, 0};
     write(mesh, mesh_schema::n_normals) = {{0, 0, 1}};
@@ -308,8 +290,6 @@ struct HostileRow {
 const HostileRow hostileRows[] = {
     {[](Exporting&, IMesh& m) { write(m, mesh_schema::n_positions)[4].y = infinity; },
      "3 gltf |mesh| Found values that are not finite in 'positions', 1 of them"},
-    {[](Exporting&, IMesh& m) { write(m, mesh_schema::n_normals)[8].z = -infinity; },
-     "3 gltf |mesh| Found values that are not finite in 'normals', 1 of them"},
     {[](Exporting&, IMesh& m) {
          write(m, mesh_schema::n_positions)[0].x = -3e38f;
          write(m, mesh_schema::n_positions)[1].x = 3e38f;
@@ -325,8 +305,6 @@ const HostileRow hostileRows[] = {
      "2 validate |mesh| The vertex positions are missing!", false},
     {[](Exporting&, IMesh& m) { write(m, mesh_schema::n_indices)[7] = 0xffffffff; },
      "2 validate |mesh| Found face index out of range at position 7!", false},
-    {[](Exporting&, IMesh& m) { write(m, mesh_schema::n_indices)[0] = 9; },
-     "2 validate |mesh| Found face index out of range at position 0!", false},
     {[](Exporting&, IMesh& m) {
          m.removeAttribute(mesh_schema::n_normals);
          m.vecAttribute<double>(mesh_schema::n_normals).resize(9);
@@ -356,8 +334,7 @@ const HostileRow hostileRows[] = {
          findListItem(m, mesh_schema::n_primitives, 0)
              ->removeAttribute(meshPrimitive_schema::n_vcounts);
      },
-     "3 gltf |mesh| Primitive 0 is of no kind that can be drawn!", false},
-};
+     "3 gltf |mesh| Primitive 0 is of no kind that can be drawn!", false}};
 
 } // namespace
 

@@ -123,8 +123,7 @@ const Row rows[] = {
          addTriangle(s, root, "m");
      },
      "1: (m)",
-     "3 gltf || An object of type 'mesh' was made before that type was known, it is left out!\n"},
-};
+     "3 gltf || An object of type 'mesh' was made before that type was known, it is left out!\n"}};
 
 } // namespace
 

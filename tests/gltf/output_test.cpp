@@ -85,8 +85,7 @@ TEST(BadTarget, IsLoggedForEachFileAndEndsNothing) {
         {"blocked.gltf", false, {bufferMessage}},
         {"full.glb", true, {mainMessage, "trying to write 4 bytes, written 0 bytes"}},
         // The length of the whole text, though it goes out in pieces.
-        {"full.gltf", true, {mainMessage, "trying to write 200715 bytes, written 0 bytes"}},
-    };
+        {"full.gltf", true, {mainMessage, "trying to write 200715 bytes, written 0 bytes"}}};
     for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         Exporting scene;

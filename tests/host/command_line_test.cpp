@@ -60,8 +60,7 @@ TEST_F(CommandLineTest, WrongOnesAreRefusedByName) {
         // All that is wrong is told at once.
         {{"-exportHair", "x", "-nonsense", "1"}, "option '-exportHair': type mismatch."},
         {{"-exportHair", "x", "-nonsense", "1"}, "option '-nonsense' is unknown"},
-        {{"-exportHair", "x", "-nonsense", "1"}, "found 0 paths"},
-    };
+        {{"-exportHair", "x", "-nonsense", "1"}, "found 0 paths"}};
     for (const auto& row : rows) {
         const Outcome outcome = run(row.arguments);
         EXPECT_EQ(outcome.exitCode, 1) << row.error;

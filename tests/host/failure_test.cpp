@@ -32,8 +32,7 @@ TEST_F(FailureTest, InputsThatCannotBeRead) {
         {"@/a.unknown", "@/a.unknown: no plugin reads files of this kind, expected .script."},
         {"@/none",
          "@/none: mesh factory: Can't load meshes without an extension, expected .script."},
-        {"@/a.script", "@/a.script: could not be read"},
-    };
+        {"@/a.script", "@/a.script: could not be read"}};
     for (const auto& row : rows)
         expectFailure(run({row.input, "@/old.out"}), 2, row.error);
     EXPECT_EQ(readFile(path("@/old.out")), "old");
@@ -56,8 +55,7 @@ TEST_F(FailureTest, ReadersAndWritersThatFail) {
         {"export throw-memory", 3, "@/a.out: there is not enough memory"},
         {"export nothing", 3, "@/a.out: there is nothing to write"},
         // A writer that crashes is a fault of this program and stays visible as one.
-        {"export abort", -6, ""},
-    };
+        {"export abort", -6, ""}};
     for (const auto& row : rows) {
         expectFailure(runScript(row.script), row.exitCode, row.error);
         EXPECT_FALSE(exists("@/a.out")) << row.script;
@@ -95,8 +93,7 @@ TEST_F(FailureTest, OutputsThatCannotBeMade) {
         {{"@/a.obj", "@/a.glb", "--quiet", "--log", "@/full.html"},
          4,
          "@/full.html: the log could"},
-        {{"@/a.obj", "@/full.gltf", "--strict"}, 4, "@/full.gltf: not all files could be written"},
-    };
+        {{"@/a.obj", "@/full.gltf", "--strict"}, 4, "@/full.gltf: not all files could be written"}};
     for (const auto& row : rows)
         expectFailure(runReal(row.arguments), row.exitCode, row.error);
     EXPECT_TRUE(exists("@/a.glb") && exists("@/folder.html"));
@@ -109,19 +106,17 @@ TEST_F(FailureTest, TheLogDecidesTheExitCode) {
     const struct {
         const char* script;
         int exitCode, strictExitCode;
-    } rows[] = {
-        {"log 4 told", 0, 0},
-        {"log 3 odd", 0, 5},
-        {"log 2 bad", 0, 5},
-        {"log 1 worst", 0, 5},
-        {"log 2 Unable to delete temporary file!", 0, 0},
-        {"log 2 Unable to write the GLTF file!", 4, 4},
-        {"log 2 Couldn't write the image to external file!", 4, 4},
-        {"log 2 Couldn't write the binary buffer to external file!", 4, 4},
-        {"log 2 Unable to write the GLTF file! Unhandled exception has occurred!", 4, 4},
-        {"log 2 Unhandled exception while closing 'a0.bin'!", 4, 4},
-        {"log 3 odd\nimport throw-number", 2, 2},
-    };
+    } rows[] = {{"log 4 told", 0, 0},
+                {"log 3 odd", 0, 5},
+                {"log 2 bad", 0, 5},
+                {"log 1 worst", 0, 5},
+                {"log 2 Unable to delete temporary file!", 0, 0},
+                {"log 2 Unable to write the GLTF file!", 4, 4},
+                {"log 2 Couldn't write the image to external file!", 4, 4},
+                {"log 2 Couldn't write the binary buffer to external file!", 4, 4},
+                {"log 2 Unable to write the GLTF file! Unhandled exception has occurred!", 4, 4},
+                {"log 2 Unhandled exception while closing 'a0.bin'!", 4, 4},
+                {"log 3 odd\nimport throw-number", 2, 2}};
     for (const auto& row : rows) {
         const std::string script = row.script + std::string("\n---\nx");
         EXPECT_EQ(runScript(script).exitCode, row.exitCode) << row.script;

@@ -61,4 +61,16 @@ inline void PrintTo(const LogCapture::Entry& entry, std::ostream* out) {
     *out << entry.channel.view() << ' ' << entry.level << ' ' << entry.text;
 }
 
+/// The messages up to a level as lines, each with its level in front.
+inline base::string linesOf(const LogCapture& log, int level = base::logDebug) {
+    base::string text;
+    for (const LogCapture::Entry& entry : log.entries())
+        if (entry.level <= level)
+            text += base::format("{} {}\n", entry.level, entry.text);
+    return text;
+}
+inline base::string problems(const LogCapture& log) {
+    return linesOf(log, base::logWarning);
+}
+
 } // namespace test_support
