@@ -4,6 +4,7 @@
 
 #include <assimp/scene.h>
 
+#include <algorithm>
 #include <cmath>
 #include <optional>
 
@@ -39,11 +40,38 @@ float findScale(const aiMetadata& data) {
     return std::isfinite(factor) && factor > 0 ? static_cast<float>(factor * 0.01) : 1.0f;
 }
 
+// The usual frames with X or Z up, which the exporter knows.
+constexpr mat33f xUp{{0, -1, 0}, {1, 0, 0}, {0, 0, 1}};
+constexpr mat33f zUp{{1, 0, 0}, {0, 0, 1}, {0, -1, 0}};
+
+/// True if `matrix` is `turn` at some scale, which is returned, and nothing else.
+bool isScaledTurn(const aiMatrix4x4& matrix, const mat33f& turn, float& scale) {
+    const aiMatrix4x4 wanted(turn.r0.x, turn.r0.y, turn.r0.z, 0, turn.r1.x, turn.r1.y, turn.r1.z, 0,
+                             turn.r2.x, turn.r2.y, turn.r2.z, 0, 0, 0, 0, 1);
+    scale = std::max({std::abs(matrix.a1), std::abs(matrix.a2), std::abs(matrix.a3)});
+    aiMatrix4x4 scaling;
+    aiMatrix4x4::Scaling(aiVector3D(scale), scaling);
+    return scale > 0 && (wanted * scaling).Equal(matrix, 1e-6f * scale);
+}
+
+void takeTurnOfRoot(aiMatrix4x4& root, SceneAxes& axes) {
+    float scale = 1;
+    if (isScaledTurn(root, xUp, scale))
+        axes.upAxis = 0;
+    else if (isScaledTurn(root, zUp, scale))
+        axes.upAxis = 2;
+    else
+        return;
+    aiMatrix4x4::Scaling(aiVector3D(scale), root);
+}
+
 } // namespace
 
-SceneAxes readAxes(const aiScene& source) {
+SceneAxes readAxes(aiScene& source, bool withTurnedRoot) {
     SceneAxes result;
-    if (!source.mMetaData)
+    if (withTurnedRoot)
+        takeTurnOfRoot(source.mRootNode->mTransformation, result);
+    if (!source.mMetaData || withTurnedRoot)
         return result;
     const aiMetadata& data = *source.mMetaData;
     const float scale = findScale(data);
@@ -58,9 +86,6 @@ SceneAxes readAxes(const aiScene& source) {
     if (normal == vec3f{} || (normal != turn.r2 && normal != -turn.r2))
         return result;
 
-    // The usual frames with X or Z up are left to the exporter, which knows just these.
-    constexpr mat33f xUp{{0, -1, 0}, {1, 0, 0}, {0, 0, 1}};
-    constexpr mat33f zUp{{1, 0, 0}, {0, 0, 1}, {0, -1, 0}};
     if (turn == xUp)
         result.upAxis = 0;
     else if (turn == zUp)

@@ -12,9 +12,10 @@ struct SceneAxes {
     base::mat43 transform; ///< what goes in front of the root's own transform
 };
 
-/// Reads what the file says of its unit and axes and what assimp has not applied already; that is
-/// the case for FBX alone (COLLADA and 3DS come with a root that is scaled and turned). Everything
-/// else counts as metres with Y up.
-SceneAxes readAxes(const aiScene& source);
+/// Reads what the file says of its unit and axes. That of FBX assimp has not applied. For formats
+/// `withTurnedRoot` (COLLADA and 3DS) it has put unit and turn into the root: a root that does
+/// nothing else keeps the unit alone, and the turn becomes `upAxis`. Everything else counts as
+/// metres with Y up.
+SceneAxes readAxes(aiScene& source, bool withTurnedRoot);
 
 } // namespace assimp

@@ -9,6 +9,7 @@
 
 #include <assimp/mesh.h>
 
+#include <algorithm>
 #include <cstring>
 
 namespace assimp {
@@ -51,6 +52,21 @@ void GeometryFaults::report(const base::string& path) const {
          "assimp |{}| Found {} normals without a direction, those of the faces are taken!");
     tell(base::logWarning, zeroTangents,
          "assimp |{}| Found {} tangents without a direction, any are taken!");
+    tell(base::logWarning, colorsOutOfRange,
+         "assimp |{}| Found {} colors with components outside 0 to 1, the nearest are taken!");
+}
+
+vector<vec4f> readColors(const aiColor4D* elements, const VertexSelection& selection,
+                         GeometryFaults& faults) {
+    vector<vec4f> colors = selection.read<vec4f>(elements);
+    faults.nonFiniteValues += repairValues(colors);
+    for (vec4f& c : colors) {
+        const vec4f given = c;
+        for (float vec4f::*component : {&vec4f::x, &vec4f::y, &vec4f::z, &vec4f::w})
+            c.*component = std::clamp(c.*component, 0.0f, 1.0f);
+        faults.colorsOutOfRange += c != given;
+    }
+    return colors;
 }
 
 namespace {
@@ -74,13 +90,6 @@ base::ref<base::IPlugin> createObject(base::PluginFactory& factory, base::name_i
     if (mesh.mName.length != 0)
         write(*object, scene::geometry_schema::n_name) = viewOf(mesh.mName);
     return object;
-}
-
-vector<vec4f> readColors(const aiColor4D* elements, const VertexSelection& selection,
-                         GeometryFaults& faults) {
-    vector<vec4f> colors = selection.read<vec4f>(elements);
-    faults.nonFiniteValues += repairValues(colors);
-    return colors;
 }
 
 /// Segments of which each starts where the one before it ends form one line.

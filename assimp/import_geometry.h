@@ -3,9 +3,13 @@
 #include "b_factory.h"
 #include "scene_options.h"
 
+#include <assimp/color4.h>
+
 struct aiMesh;
 
 namespace assimp {
+
+struct VertexSelection;
 
 /// The settings of an import that concern geometry.
 struct GeometrySettings {
@@ -26,12 +30,17 @@ struct GeometryFaults {
     base::u64 nonFiniteValues = 0;
     base::u64 zeroNormals = 0;
     base::u64 zeroTangents = 0;
+    base::u64 colorsOutOfRange = 0;
 
     /// Logs one line for each kind that occurred.
     void report(const base::string& path) const;
 };
 
 using GeometryObjects = base::vector<base::ref<base::IPlugin>>;
+
+/// The colors of the selected vertices, brought into the range 0 to 1.
+base::vector<base::vec4f> readColors(const aiColor4D* elements, const VertexSelection& selection,
+                                     GeometryFaults& faults);
 
 /// Makes the scene objects of one assimp mesh, which may hold faces of several kinds: at most one
 /// `mesh` (its polygons), one `lines` and one `points`. All carry the mesh's name.

@@ -2,12 +2,14 @@
 
 #include "assimp/library_text.h"
 
+#include "b_log.h"
 #include "scene_schema.h"
 #include "scene_transform.h"
 
 #include <assimp/ColladaMetaData.h>
 #include <assimp/scene.h>
 
+#include <algorithm>
 #include <cmath>
 
 namespace assimp {
@@ -29,6 +31,8 @@ struct Pending {
 /// The name in the file; empty where assimp made one up.
 base::string nameOf(const aiNode& node) {
     const string_view name = viewOf(node.mName);
+    if (name.starts_with('<') && name.ends_with('>')) // such as "<3DSRoot>"
+        return {};
     if (!name.starts_with("$ColladaAutoName$"))
         return base::string(name);
     aiString id;
@@ -39,11 +43,17 @@ base::string nameOf(const aiNode& node) {
 
 /// The transform of a node relative to its parent; the identity where the file's is not finite.
 mat43 readTransform(const aiNode& node) {
+    const auto warn = [&](const char* text) {
+        base::log().log(base::logScene, base::logWarning, text, nameOf(node));
+    };
     const aiMatrix4x4& m = node.mTransformation;
     const float* values = &m.a1;
-    for (int i = 0; i < 12; ++i)
-        if (!std::isfinite(values[i]))
-            return {};
+    if (std::any_of(values, values + 12, [](float v) { return !std::isfinite(v); })) {
+        warn("assimp |{}| The transform has numbers that are not finite, the identity is taken!");
+        return {};
+    }
+    if (m.d1 != 0 || m.d2 != 0 || m.d3 != 0 || m.d4 != 1)
+        warn("assimp |{}| The transform is not affine, its last row is left out!");
     return {{{m.a1, m.a2, m.a3}, {m.b1, m.b2, m.b3}, {m.c1, m.c2, m.c3}}, {m.a4, m.b4, m.c4}};
 }
 

@@ -268,7 +268,7 @@ void PolygonImport::writeColors() {
             continue;
         using Schema = scene::meshColorSet_schema;
         AttribMap& set = appendItem<Schema>(object_, mesh_schema::n_colorSets);
-        vector<vec4f> colors = readRepaired<vec4f>(source);
+        vector<vec4f> colors = readColors(source, selection_, faults_);
         weldCorners(set, Schema::n_indices, colors);
         vector<vec3f>& opaque = write(set, Schema::n_RGB);
         opaque.reserve(colors.size());

@@ -54,32 +54,61 @@ public:
     }
 };
 
-/// While it lives the library's messages are passed on, if the log takes any of that level. The
-/// library has no logger else and writes nowhere.
-class LibraryLog {
+/// Keeps the errors that the library goes on after: what it could not read is missing then. Those
+/// about materials are left out, as materials are not taken over.
+class LibraryErrors final : public Assimp::LogStream {
 public:
-    LibraryLog() : active_(base::log().levelLimit() >= base::logDebug) {
-        if (!active_)
+    explicit LibraryErrors(base::vector<base::string>& texts) : texts_(texts) {}
+    void write(const char* message) override {
+        const base::string_view text = base::trimmed(message);
+        if (text.find("aterial") != text.npos)
             return;
-        Assimp::DefaultLogger::create("", Assimp::Logger::NORMAL, 0);
-        Assimp::DefaultLogger::get()->attachStream(
-            new LibraryMessages, Assimp::Logger::Err | Assimp::Logger::Warn | Assimp::Logger::Info);
+        const std::size_t mark = text.find(": "); // behind "Error, T0"
+        texts_.push_back(base::string(text.substr(mark == text.npos ? 0 : mark + 2)));
     }
-    ~LibraryLog() {
-        if (active_)
-            Assimp::DefaultLogger::kill();
-    }
-    LibraryLog(const LibraryLog&) = delete;
-    LibraryLog& operator=(const LibraryLog&) = delete;
 
 private:
-    bool active_;
+    base::vector<base::string>& texts_;
 };
+
+/// While it lives the library's errors are kept and its messages passed on, if the log takes any of
+/// that level. The library has no logger else and writes nowhere.
+class LibraryLog {
+public:
+    explicit LibraryLog(base::vector<base::string>& errors) {
+        using Assimp::Logger;
+        Assimp::DefaultLogger::create("", Logger::NORMAL, 0);
+        Assimp::DefaultLogger::get()->attachStream(new LibraryErrors(errors), Logger::Err);
+        if (base::log().levelLimit() >= base::logDebug)
+            Assimp::DefaultLogger::get()->attachStream(new LibraryMessages,
+                                                       Logger::Err | Logger::Warn | Logger::Info);
+    }
+    ~LibraryLog() { Assimp::DefaultLogger::kill(); }
+    LibraryLog(const LibraryLog&) = delete;
+    LibraryLog& operator=(const LibraryLog&) = delete;
+};
+
+/// Warns of what the library could not read.
+void reportErrors(const base::vector<base::string>& errors, const base::string& path) {
+    constexpr std::size_t mostTold = 10;
+    for (std::size_t i = 0; i < std::min(errors.size(), mostTold); ++i)
+        base::log().log(base::logIO, base::logWarning, "assimp |{}| {}", path, errors[i]);
+    if (errors.size() > mostTold)
+        base::log().log(base::logIO, base::logWarning, "assimp |{}| There are {} more such errors.",
+                        path, errors.size() - mostTold);
+}
+
+/// True for a scene that holds nothing at all: readers make such ones of files of other kinds.
+bool isEmpty(const aiScene& scene) {
+    return scene.mNumMeshes + scene.mNumCameras + scene.mNumLights + scene.mNumAnimations == 0 &&
+           (!scene.mRootNode || scene.mRootNode->mNumChildren == 0);
+}
 
 /// Null, with the reason in `error`, if the file can't be read. The steps of the library that
 /// change a scene are not used.
 std::unique_ptr<aiScene> readFile(const base::string& path, base::string& error) {
-    const LibraryLog log;
+    base::vector<base::string> errors;
+    const LibraryLog log(errors);
     try {
         if (!isPlyHeaderWhole(path)) {
             error = "The header has no end.";
@@ -90,9 +119,15 @@ std::unique_ptr<aiScene> readFile(const base::string& path, base::string& error)
         importer.SetPropertyBool(AI_CONFIG_IMPORT_NO_SKELETON_MESHES, true);
         // What the file's author wrote, not the ids beside it.
         importer.SetPropertyBool(AI_CONFIG_IMPORT_COLLADA_USE_COLLADA_NAMES, true);
-        if (importer.ReadFile(base::fs::master().resolve(path), 0))
-            return std::unique_ptr<aiScene>(importer.GetOrphanedScene());
-        error = importer.GetErrorString();
+        if (const aiScene* scene = importer.ReadFile(base::fs::master().resolve(path), 0)) {
+            if (!isEmpty(*scene)) {
+                reportErrors(errors, path);
+                return std::unique_ptr<aiScene>(importer.GetOrphanedScene());
+            }
+            error = errors.empty() ? "It holds neither nodes nor meshes." : errors[0];
+        } else {
+            error = importer.GetErrorString();
+        }
     } catch (const std::exception& e) {
         error = e.what();
     } catch (...) {
@@ -155,9 +190,13 @@ bool AssimpImporter::load(base::PluginFactory& scene, const base::string& path) 
                         path, source ? "It has no nodes." : base::string(base::trimmed(error)));
         return false;
     }
+    if (source->mNumMeshes == 0)
+        base::log().log(base::logIO, base::logWarning, "assimp |{}| The file has no geometry!",
+                        path);
     const base::vector<GeometryObjects> geometry =
         importMeshes(*source, GeometrySettings(*this), scene, path);
-    const SceneAxes axes = readAxes(*source);
+    const base::string extension = base::toLower(base::fs::extension(path));
+    const SceneAxes axes = readAxes(*source, extension == "dae" || extension == "3ds");
     base::ref<base::IPlugin> root =
         importNodes(*source->mRootNode, axes.transform, geometry, scene);
 

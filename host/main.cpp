@@ -30,7 +30,7 @@ base::string formatsText(const scene::SceneFactory& factory) {
                         list(factory.getExporterExtensions()));
 }
 
-ExitCode runLogged(const CommandLine& line, const Messages& messages, StageClock clock) {
+ExitCode runLogged(const CommandLine& line, Messages& messages, StageClock clock) {
     const auto factory = base::makeRef<scene::SceneFactory>("scene");
     loadPlugins(*factory, line.host.pluginFolder);
     base::CmdLineOptions registered;
@@ -38,6 +38,7 @@ ExitCode runLogged(const CommandLine& line, const Messages& messages, StageClock
     clock.end();
 
     if (line.host.help || line.host.version || line.host.formats) {
+        messages.openLogFile();
         print(stdout, line.host.help      ? helpText(registered)
                       : line.host.version ? versionText(*factory)
                                           : formatsText(*factory));
@@ -45,6 +46,7 @@ ExitCode runLogged(const CommandLine& line, const Messages& messages, StageClock
     }
     parseOptions(line, registered);
     checkFilesDiffer(line, findSideFile(line, registered));
+    messages.openLogFile();
     return Run(*factory, line, registered, messages, std::move(clock)).execute();
 }
 

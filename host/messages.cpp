@@ -54,7 +54,10 @@ public:
         line.append(": ");
         if (level < static_cast<int>(std::size(prefixes)))
             line.append(prefixes[level]);
-        line.append(printable(base::trimmed(text))).append("\n");
+        // A line end in a name must not look like a message of its own.
+        for (const char c : printable(base::trimmed(text)))
+            line.append(c == '\n' ? "\n    " : string(1, c));
+        line.append("\n");
         bar_.erase();
         print(stderr, line);
         bar_.redraw();
@@ -113,31 +116,64 @@ public:
     vector<Message> all;
 };
 
-Messages::Messages(const HostOptions& options) : record_(base::makeRef<Record>()) {
+/// Holds the messages for a log file that is not open yet.
+class Messages::Waiting final : public base::ICustomLog {
+public:
+    Waiting() { setLevelLimit(base::logDebug); }
+
+    void message(base::name_id messageChannel, int level, string_view text) override {
+        held_.push_back({messageChannel, level, {}, string(text)});
+    }
+    void progress(base::u32, string_view) override {}
+    void progressEnd() override {}
+
+    void passTo(base::ICustomLog& output) const {
+        for (const Message& message : held_)
+            output.message(message.channel, message.level, message.text);
+    }
+
+private:
+    vector<Message> held_;
+};
+
+Messages::Messages(const HostOptions& options)
+    : logPath_(options.logFile), record_(base::makeRef<Record>()) {
     base::log().setLevelLimit(options.verbose > 1 ? base::logDebug : base::logInformation);
     outputs_ = {record_, base::makeRef<Console>(options)};
-    if (!options.logFile.empty())
-        attachLogFile(options.logFile);
+    if (!logPath_.empty()) {
+        waiting_ = base::makeRef<Waiting>();
+        outputs_.push_back(waiting_);
+    }
     for (const base::ref<base::ICustomLog>& output : std::as_const(outputs_))
         base::log().addOutput(output);
 }
 
-void Messages::attachLogFile(const string& givenPath) {
-    checkOutput(givenPath);
-    const string path = base::fs::master().resolve(givenPath);
+void Messages::openLogFile() {
+    if (!waiting_)
+        return;
+    const base::ref<base::ICustomLog> file = makeFileOutput();
+    file->setLevelLimit(base::logDebug); // the log's own limit decides
+    waiting_->passTo(*file);
+    base::log().removeOutput(waiting_.get());
+    waiting_.reset();
+    outputs_.data()[outputs_.size() - 1] = file;
+    base::log().addOutput(file);
+}
+
+base::ref<base::ICustomLog> Messages::makeFileOutput() {
+    checkOutput(logPath_);
+    const string path = base::fs::master().resolve(logPath_);
     constexpr string_view htmlExtension = ".html";
     if (path.ends_with(htmlExtension)) {
         htmlLog_ = base::makeRef<base::HtmlLog>(path.substr(0, path.size() - htmlExtension.size()));
         if (htmlLog_->hasFailed())
-            throw logFileFailure(givenPath, std::strerror(errno));
-        outputs_.push_back(htmlLog_);
-    } else {
-        logFile_ = std::fopen(path.c_str(), "we");
-        if (!logFile_)
-            throw logFileFailure(givenPath, std::strerror(errno));
-        outputs_.push_back(base::makeRef<base::StdLog>(path, logFile_));
+            throw logFileFailure(logPath_, std::strerror(errno));
+        return htmlLog_;
     }
-    outputs_.cend()[-1]->setLevelLimit(base::logDebug); // the log's own limit decides
+    logFile_ = std::fopen(path.c_str(), "we");
+    if (!logFile_)
+        throw logFileFailure(logPath_, std::strerror(errno));
+    return base::makeRef<base::StdLog>(path, logFile_);
 }
 
 Messages::~Messages() {

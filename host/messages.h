@@ -25,11 +25,15 @@ base::string objectOf(base::string_view message);
 /// one about a temporary file that is removed twice, which counts nowhere.
 class Messages {
 public:
-    /// Throws `Failure` if the log file can't be written.
     explicit Messages(const HostOptions& options);
     ~Messages();
     Messages(const Messages&) = delete;
     Messages& operator=(const Messages&) = delete;
+
+    /// Opens the file that --log names, if any, for the messages so far and those to come: once
+    /// the command line has turned out right, since what the file held is lost. Throws `Failure` if
+    /// it can't be written.
+    void openLogFile();
 
     const base::vector<Message>& all() const;
     /// Number of messages that tell that an output file could not be written.
@@ -39,9 +43,12 @@ public:
 
 private:
     class Record;
-    void attachLogFile(const base::string& givenPath);
+    class Waiting;
+    base::ref<base::ICustomLog> makeFileOutput();
 
+    base::string logPath_;
     base::ref<Record> record_;
+    base::ref<Waiting> waiting_; ///< until the log file is open
     base::vector<base::ref<base::ICustomLog>> outputs_;
     std::FILE* logFile_ = nullptr; ///< of the plain text form
     base::ref<base::HtmlLog> htmlLog_;

@@ -16,7 +16,7 @@ class AttribMap;
 
 /// Bits of an attribute's flags word, by position.
 enum AttribFlag : u32 {
-    attribUntracked = 1u << 0,        ///< enters no weak-link chain; paths resolve it on each use
+    attribUntracked = 1u << 0,        ///< no step of a path keeps it; paths resolve it on each use
     attribSilentLink = 1u << 7,       ///< an unresolved link is not reported
     attribPluginMark = 1u << 10,      ///< set by `IPlugin::markCreated`
     attribNoTargets = 1u << 11,       ///< a morph with it is exported without targets
@@ -174,6 +174,8 @@ public:
     Attribute* clone() const override;
     /// Takes over the path as well.
     bool assign(const Attribute& other, u32 mode, i32 index = -1) override;
+    /// Clears the path.
+    void setData(const void* value, i32 index = -1) override;
 
     AttribPath path; ///< empty unless the reference was found by a path
 };

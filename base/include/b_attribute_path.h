@@ -12,8 +12,7 @@ class Attribute;
 class AttribLink;
 class IPlugin;
 
-/// Pointer to an attribute that is cleared when the attribute dies. An attribute with the flag
-/// `attribUntracked` is never stored.
+/// Pointer to an attribute that is cleared when the attribute dies.
 class BASE1_API AttribWeakLink {
 public:
     AttribWeakLink() = default;

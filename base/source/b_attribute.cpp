@@ -75,6 +75,11 @@ bool PluginAttribute::assign(const Attribute& other, u32 mode, i32 index) {
     return true;
 }
 
+void PluginAttribute::setData(const void* value, i32 index) {
+    TypedAttribute::setData(value, index);
+    path = {};
+}
+
 PluginVectorAttribute::PluginVectorAttribute() {
     setFlags(attribMergeOnAssign);
 }
@@ -90,8 +95,8 @@ Attribute* PluginVectorAttribute::clone() const {
 
 Attribute* AttribFactory::create(name_id type) const {
     const auto found = creators_.find(type);
-    if (found != creators_.end())
-        return found->second();
+    if (Attribute* made = found == creators_.end() ? nullptr : found->second())
+        return made;
     log().log(logSystem, logWarning, "factory: Trying to create am item with unknown type {}.",
               type);
     return nullptr;

@@ -33,6 +33,8 @@ void takeValue(Attribute& target, Attribute& source) {
         array->takeItems(*source.asArray());
     else
         target.setData(source.data(-1), -1);
+    if (auto* plugin = dynamic_cast<PluginAttribute*>(&target))
+        plugin->path = static_cast<const PluginAttribute&>(source).path;
 }
 
 } // namespace
@@ -375,7 +377,8 @@ void AttribMap::takeEntries(AttribMap& other) {
         return;
     clear();
     entries_.swap(other.entries_);
-    typeName_ = other.typeName();
+    if (other.typeName())
+        typeName_ = other.typeName();
 }
 
 } // namespace base

@@ -65,8 +65,6 @@ PathStep makeStep(PathStepKind kind, name_id name, u32 index) {
 } // namespace
 
 void AttribWeakLink::set(Attribute* target) noexcept {
-    if (target && target->hasFlag(attribUntracked))
-        target = nullptr;
     if (target == target_)
         return;
     if (target_) {
@@ -165,7 +163,8 @@ Attribute* AttribPath::resolveStep(u32& hopsLeft) const {
         } else if (current && step.kind == PathStepKind::element && current->asArray()) {
             next = current->asArray()->item(step.index);
         }
-        step.target.set(stable ? next : nullptr);
+        const bool stays = stable && next && !next->hasFlag(attribUntracked);
+        step.target.set(stays ? next : nullptr);
         current = next;
     }
     return current;

@@ -186,7 +186,8 @@ void AttribArray::takeItems(AttribArray& other) {
     if (&other == this)
         return;
     deleteAll(std::exchange(items_, std::move(other.items_)));
-    typeName_ = other.typeName_;
+    if (other.typeName_)
+        typeName_ = other.typeName_;
 }
 
 AttribLink::~AttribLink() = default;

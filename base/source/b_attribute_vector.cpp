@@ -58,13 +58,18 @@ name_id scalarName() {
         return {};
 }
 
-/// The parts between commas; the blank that follows one in the text form is no part of them.
+/// The parts between commas; the blank that follows one in the text form is no part of them. Texts
+/// may hold commas, so there the blank parts them too.
 template <class T>
 bool parseElements(string_view text, vector<T>& values) {
-    const vector<string_view> parts = text.empty() ? vector<string_view>() : split(text, ',');
+    constexpr string_view separator = std::is_same_v<T, string> ? ", " : ",";
     vector<T> parsed;
-    for (string_view part : parts) {
-        if (!parsed.empty() && part.starts_with(' '))
+    for (bool isOver = text.empty(); !isOver;) {
+        const std::size_t end = text.find(separator);
+        isOver = end == string_view::npos;
+        string_view part = text.substr(0, end);
+        text.remove_prefix(isOver ? text.size() : end + separator.size());
+        if (!std::is_same_v<T, string> && !parsed.empty() && part.starts_with(' '))
             part.remove_prefix(1);
         if (!parseValueText(part, parsed.emplace_back()))
             return false;

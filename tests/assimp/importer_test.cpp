@@ -60,7 +60,8 @@ TEST_F(Importer, FilesThatCannotBeReadGiveOneErrorAndNothingElse) {
         {"text.ply", "This is no model, but some text that is long enough for a header."},
         {"cut.ply", "ply\nformat ascii 1.0\ncomment end_header\nelement vertex 3\nprop"},
         {"old.fbx", "; FBX 6.1.0 project file\nFBXHeaderExtension:  {\nFBXVersion: 6100\n}\n"},
-        {"text.3ds", "This is no model."}};
+        {"text.3ds", "This is no model."},
+        {"text.x3d", "hello\n"}};
     for (const auto& c : cases) {
         SCOPED_TRACE(c.name);
         const string path = write(c.name, c.text);
@@ -93,6 +94,17 @@ TEST_F(Importer, MessagesOfTheLibraryAreForDebugging) {
     base::log().setLevelLimit(base::logInformation);
     ASSERT_TRUE(loadPath(path));
     EXPECT_TRUE(log.entries().empty());
+}
+
+TEST_F(Importer, ErrorsThatTheLibraryGoesOnAfterAreWarnings) {
+    const string path = write("model.off", "OFF\n3 2 0\n0 0 0\n1 0 0\n0 1 0\n3 0 1 2\n3 0 1 77\n");
+    LogCapture log;
+    base::log().setLevelLimit(base::logWarning);
+    ASSERT_TRUE(loadPath(path));
+    ASSERT_EQ(log.entries().size(), 1u);
+    const string& text = log.entries()[0].text;
+    EXPECT_TRUE(text.starts_with("assimp |" + path + "| ")) << text;
+    EXPECT_NE(text.find("index is out of range"), string::npos) << text;
 }
 
 } // namespace

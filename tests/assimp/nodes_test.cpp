@@ -74,9 +74,9 @@ TEST_F(Nodes, TreeNamesAndSharedMeshes) {
     EXPECT_EQ(mesh().getName(), "Plate");
     EXPECT_EQ(only(scene_schema::n_kind).getName(), "plates");
 
-    // Unit and axis of the file are in the root, and nowhere else.
-    expectNear(transformed(transformOf(root()), {1, 2, 3}), {0.0254, 3 * 0.0254, -2 * 0.0254});
-    EXPECT_EQ(read(only(scene_schema::n_kind), scene_schema::n_upAxis), 1);
+    // The unit of the file is in the root and its axis in the scene, and nowhere else.
+    expectNear(transformed(transformOf(root()), {1, 2, 3}), {0.0254, 2 * 0.0254, 3 * 0.0254});
+    EXPECT_EQ(read(only(scene_schema::n_kind), scene_schema::n_upAxis), 2);
 
     // A mirrored node as the file has it, without a rotation.
     const auto nodes = objects(node_schema::n_kind);

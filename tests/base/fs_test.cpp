@@ -144,6 +144,7 @@ TEST(FsPath, ReplacesAliases) {
         {"file:///tmp//x", "/tmp/x"},
         {"/assets/a", "/assets/a"},
         {"assetsx/a", "assetsx/a"},
+        {"assets/a:/x", "/data/assets/a:/x"},
         {"assets", "/data/assets/"},
         {"loop", "loop/x/x/x/x/x/x/x/x/x/x/x/x/x/x/x/x"}};
     for (const auto& [path, expected] : rows)

@@ -170,9 +170,14 @@ TEST(Scene, GivesTheSameBytesAgain) {
 TEST(Scene, GivesTheSameBytesWhateverTheOrderOfNames) {
     if (base::nameServer().find("positions"))
         GTEST_SKIP() << "the names have their order already";
-    const TempFolder folder;
-    const std::string paths[] = {folder / "forwards.glb", folder / "backwards.glb"};
-    for (const std::string& path : paths) {
+    const struct {
+        const char* name;
+        bool embedded, compress;
+    } forms[] = {{"plain.glb", true, false},     {"compressed.glb", true, true},
+                 {"embedded.gltf", true, false}, {"embedded_compressed.gltf", true, true},
+                 {"files.gltf", false, false},   {"files_compressed.gltf", false, true}};
+    const TempFolder forwards, backwards;
+    for (const TempFolder* folder : {&forwards, &backwards}) {
         const pid_t child = ::fork();
         if (child == 0) {
             std::vector<const char*> names;
@@ -180,21 +185,28 @@ TEST(Scene, GivesTheSameBytesWhateverTheOrderOfNames) {
                                      scene::node_schema::names(), scene::scene_schema::names()})
                 for (const scene::SchemaName* name : list)
                     names.push_back(name->text);
-            if (path == paths[1])
+            if (folder == &backwards)
                 std::ranges::reverse(names);
             for (const char* name : names)
                 base::nameServer().id(name);
-            auto scene = std::make_unique<Exporting>();
-            fill(*scene);
-            const bool saved = scene->save(path);
-            scene.reset();
+            bool saved = true;
+            for (const auto& form : forms) {
+                auto scene = std::make_unique<Exporting>();
+                scene->set(Exporting::Settings::n_exportEmbedded, form.embedded);
+                scene->set(Exporting::Settings::n_exportCompress, form.compress);
+                fill(*scene);
+                saved &= scene->save(*folder / form.name);
+            }
             ::_exit(saved ? 0 : 1);
         }
         int status = -1;
         ASSERT_EQ(::waitpid(child, &status, 0), child);
         ASSERT_EQ(status, 0);
     }
-    EXPECT_EQ(readText(paths[0]), readText(paths[1]));
+    for (const auto& form : forms)
+        EXPECT_EQ(readText(forwards / form.name), readText(backwards / form.name)) << form.name;
+    for (const char* file : {"files0.bin", "files_compressed0.bin"})
+        EXPECT_EQ(readText(forwards / file), readText(backwards / file)) << file;
 }
 
 namespace {

@@ -151,6 +151,15 @@ TEST_F(CommandLineTest, LogFilesTakeAllMessages) {
     EXPECT_NE(html.find("<td class=\"err\"><pre>&lt;bad&gt;</pre></td>"), std::string::npos);
     EXPECT_NE(html.find("deep"), std::string::npos);
     EXPECT_NE(html.find("Terminated at"), std::string::npos);
+
+    // A slip in the command line must not cost the file that was taken for the log.
+    for (const Arguments& options : {Arguments{}, Arguments{"-scriptNothing", "1", "@/a.script"}}) {
+        Arguments arguments{"--log", "@/run.txt"};
+        arguments.insert(arguments.end(), options.begin(), options.end());
+        arguments.push_back("@/a.out");
+        EXPECT_EQ(run(arguments).exitCode, 1);
+        EXPECT_EQ(readFile(path("@/run.txt")), text);
+    }
 }
 
 } // namespace

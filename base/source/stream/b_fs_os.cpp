@@ -366,7 +366,7 @@ string tmpPath() {
 }
 
 string tmpFilename(const string& folder, const string& prefix) {
-    string path = joined(master().resolve(folder), prefix + "XXXXXX");
+    string path = joined(master().resolve(folder), "") + prefix + "XXXXXX";
     const FileHandle file(mkostemp(path.data(), O_CLOEXEC));
     if (file.get() < 0)
         throw api_exception("Can't get a temp file name", errno, "b_fs", "base::fs::tmpFilename",

@@ -115,12 +115,14 @@ string Aliases::resolve(string path) const {
     for (int i = 0; i < maxReplacements; ++i) {
         string_view rest = path;
         string_view name = takeComponent(rest);
+        const std::size_t length = name.size();
         if (name.ends_with(':'))
             name.remove_suffix(1);
         const auto found = names_.find(name);
         if (found == names_.end())
             break;
-        path = rest.empty() ? found->second : joined(found->second, rest);
+        // What follows lies below the replacement, even if it looks absolute.
+        path.replace(0, length, found->second);
     }
     return path;
 }
