@@ -57,9 +57,9 @@ mat43 readTransform(const aiNode& node) {
     return {{{m.a1, m.a2, m.a3}, {m.b1, m.b2, m.b3}, {m.c1, m.c2, m.c3}}, {m.a4, m.b4, m.c4}};
 }
 
-/// True for a helper node that stands for one factor of its child's transform.
+/// True for a helper node that stands for one factor of its children's transforms.
 bool isTransformFactor(const aiNode& node) {
-    return node.mNumChildren == 1 && node.mNumMeshes == 0 &&
+    return node.mNumChildren != 0 && node.mNumMeshes == 0 &&
            viewOf(node.mName).find("_$AssimpFbx$_") != string_view::npos;
 }
 
@@ -92,9 +92,10 @@ base::ref<base::IPlugin> importNodes(const aiNode& root, const mat43& rootTransf
         auto [source, parent, transform] = std::as_const(pending).back();
         pending.pop_back();
         transform = scene::multiply(transform, readTransform(*source));
-        while (isTransformFactor(*source)) {
-            source = source->mChildren[0];
-            transform = scene::multiply(transform, readTransform(*source));
+        if (parent && isTransformFactor(*source)) {
+            for (u32 i = source->mNumChildren; i-- > 0;)
+                pending.push_back({source->mChildren[i], parent, transform});
+            continue;
         }
         base::ref<base::IPlugin> node = importNode(*source, transform, geometry, factory);
         if (parent)

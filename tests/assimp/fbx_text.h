@@ -12,6 +12,7 @@ struct FbxText {
     std::string unit = "1";
     std::string layers;     ///< elements of the geometry, a square from the origin in the XY plane
     std::string properties; ///< of the model "panel", which has the geometry
+    bool hasTwins = false;  ///< "panel" has two children and not one
 
     std::string text() const {
         const auto number = [](const char* name, int value) {
@@ -34,8 +35,10 @@ struct FbxText {
                "Model: 20, \"Model::panel\", \"Mesh\" {\nVersion: 232\nProperties70:  {\n" +
                properties +
                "}\n}\n"
-               "Model: 21, \"Model::child\", \"Null\" {\nVersion: 232\n}\n}\n"
-               "Connections:  {\nC: \"OO\",20,0\nC: \"OO\",10,20\nC: \"OO\",21,20\n}\n";
+               "Model: 21, \"Model::child\", \"Null\" {\nVersion: 232\n}\n" +
+               (hasTwins ? "Model: 22, \"Model::twin\", \"Null\" {\nVersion: 232\n}\n" : "") +
+               "}\nConnections:  {\nC: \"OO\",20,0\nC: \"OO\",10,20\nC: \"OO\",21,20\n" +
+               (hasTwins ? "C: \"OO\",22,20\n" : "") + "}\n";
     }
 
     static std::string vectorProperty(const std::string& name, const std::string& values) {

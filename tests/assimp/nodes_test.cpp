@@ -133,6 +133,18 @@ TEST_F(Nodes, FbxPivotsAreOneNode) {
     expectNear(transformed(transformOf(panel), {6, 0, 0}), {6, 3, 3});
 }
 
+TEST_F(Nodes, FbxGeometryTransformsDoNotReachTheChildren) {
+    FbxText fbx;
+    fbx.hasTwins = true;
+    fbx.properties = fbx.vectorProperty("GeometricTranslation", "1,2,3");
+    ASSERT_TRUE(load("geometric.fbx", fbx.text()));
+    EXPECT_EQ(outline(root()), "RootNode(panel(* child twin))");
+    const auto nodes = objects(node_schema::n_kind);
+    expectNear(transformed(transformOf(*nodes[1]), {0, 0, 0}), {1, 2, 3});
+    for (std::size_t i : {2, 3})
+        expectNear(transformed(transformOf(*nodes[i]), {0, 0, 0}), {-1, -2, -3});
+}
+
 TEST_F(Nodes, DeepTreesNeedNoStack) {
     constexpr int depth = 20000;
     std::string text = "xof 0303txt 0032\n";
