@@ -6,25 +6,23 @@
 #include <draco/mesh/mesh.h>
 #include <gtest/gtest.h>
 
+#include <cmath>
 #include <cstring>
-#include <fstream>
-#include <functional>
 
 namespace test_support {
 namespace {
 
 void append(Bytes& bytes, const void* data, size_t size) {
-    const auto* first = static_cast<const uint8_t*>(data);
-    bytes.insert(bytes.end(), first, first + size);
+    bytes.resize(bytes.size() + size);
+    std::memcpy(bytes.data() + bytes.size() - size, data, size);
 }
 
-/// A container with the parts as given, right or wrong.
-Bytes makeGlb(const std::string& json, const Bytes& binary, uint32_t version = 2,
-              uint32_t binaryType = 0x004E4942) {
+/// A container of the parts as given.
+Bytes makeGlb(const std::string& json, const Bytes& binary) {
+    const uint32_t binaryType = 0x004E4942;
     const uint32_t lengths[] = {static_cast<uint32_t>(json.size()),
                                 static_cast<uint32_t>(binary.size())};
-    const uint32_t header[] = {0x46546C67, version, 28 + lengths[0] + lengths[1], lengths[0],
-                               0x4E4F534A};
+    const uint32_t header[] = {0x46546C67, 2, 28 + lengths[0] + lengths[1], lengths[0], 0x4E4F534A};
     Bytes bytes;
     append(bytes, header, sizeof(header));
     append(bytes, json.data(), json.size());
@@ -32,15 +30,6 @@ Bytes makeGlb(const std::string& json, const Bytes& binary, uint32_t version = 2
     append(bytes, &binaryType, 4);
     append(bytes, binary.data(), binary.size());
     return bytes;
-}
-
-std::string errorOf(const std::function<void()>& action) {
-    try {
-        action();
-    } catch (const GltfError& error) {
-        return error.what();
-    }
-    return "no error";
 }
 
 /// Two right triangles in a quad of 3 x 4, two nodes that draw it: one at twice the size and
@@ -103,150 +92,6 @@ TEST(GltfReader, ReadsContainer) {
         EXPECT_NEAR(statistics.drawn.bounds.max[axis], max[axis], 1e-9);
     }
     EXPECT_NEAR(statistics.drawn.volume, -48.0 * 10 / 3, 1e-9);
-}
-
-TEST(GltfReader, RejectsBrokenContainers) {
-    const Bytes good = makeGlb(padded(quadJson), quadBytes());
-    const auto load = [](const Bytes& bytes) {
-        return errorOf([&] { GltfFile::fromBinary(Bytes(bytes)); });
-    };
-    ASSERT_EQ(load(good), "no error");
-    for (size_t size = 0; size < good.size(); ++size) {
-        EXPECT_NE(load({good.begin(), good.begin() + static_cast<ptrdiff_t>(size)}), "no error")
-            << size;
-    }
-    Bytes longer = good;
-    longer.push_back(0);
-    EXPECT_NE(load(longer), "no error");
-    Bytes otherMagic = good;
-    otherMagic[0] = 'G';
-    EXPECT_EQ(load(otherMagic), "glb: wrong magic");
-
-    Bytes tooLong = quadBytes();
-    tooLong.insert(tooLong.end(), 4, 0);
-    Bytes badPadding = quadBytes();
-    badPadding.back() = 1;
-    struct Row {
-        const char* text;
-        Bytes bytes;
-    };
-    std::string shorter = quadJson;
-    shorter.replace(shorter.rfind("76"), 2, "73");
-    const Row rows[] = {
-        {"glb: version 1", makeGlb(padded(quadJson), quadBytes(), 1)},
-        {"glb: wrong type of the BIN chunk", makeGlb(padded(quadJson), quadBytes(), 2, 1)},
-        {"glb: the length of the JSON chunk is no multiple of 4",
-         makeGlb(padded(quadJson) + " ", quadBytes())},
-        {"glb: more than three blanks behind the JSON text",
-         makeGlb(padded(quadJson) + "    ", quadBytes())},
-        {"glb: the JSON chunk is padded with something else than blanks",
-         makeGlb(padded(quadJson + "\n"), quadBytes())},
-        {"/buffers/0: wrong number of bytes behind the content",
-         makeGlb(padded(quadJson), tooLong)},
-        {"/buffers/0: padding that is not zero", makeGlb(padded(shorter), badPadding)},
-    };
-    for (const Row& row : rows) {
-        EXPECT_EQ(load(row.bytes), row.text);
-    }
-}
-
-TEST(GltfReader, ReadsTextWithDataUri) {
-    // The base64 text holds the bytes 1, 2, 3, 0, 4, 5, 6, 0, 0x80, 0xFF.
-    const std::string json = R"({"buffers":[{"byteLength":10,
-"uri":"data:application/octet-stream;base64,AQIDAAQFBgCA/w=="}],
-"bufferViews":[{"buffer":0,"byteLength":8},{"buffer":0,"byteOffset":8,"byteLength":2}],
-"accessors":[{"bufferView":0,"componentType":5121,"count":1,"type":"MAT2"},
-{"bufferView":1,"componentType":5120,"normalized":true,"count":2,"type":"SCALAR"},
-{"bufferView":1,"componentType":5122,"count":1,"type":"SCALAR"},
-{"bufferView":0,"byteOffset":2,"componentType":5123,"count":2,"type":"SCALAR"},
-{"bufferView":0,"componentType":5125,"count":2,"type":"SCALAR"},
-{"bufferView":0,"byteOffset":1,"componentType":5123,"count":4,"type":"SCALAR"}]})";
-    const GltfFile file = GltfFile::fromText(json);
-    // Columns of a matrix of bytes start at multiples of four.
-    EXPECT_EQ(file.accessor(0).values, (std::vector<double>{1, 2, 4, 5}));
-    EXPECT_EQ(file.accessor(1).values, (std::vector<double>{-1, -1.0 / 127}));
-    EXPECT_EQ(file.accessor(2).values, (std::vector<double>{-128}));
-    EXPECT_EQ(file.accessor(3).values, (std::vector<double>{3, 0x0504}));
-    EXPECT_EQ(file.accessor(4).values, (std::vector<double>{0x00030201, 0x00060504}));
-    EXPECT_EQ(errorOf([&] { file.accessor(5); }), "/accessors/5: ends at byte 9 of a view of 8");
-    std::string broken = json;
-    broken.replace(broken.find("AQID"), 4, "AQ*D");
-    EXPECT_NE(errorOf([&] { GltfFile::fromText(broken); }), "no error");
-    EXPECT_NE(errorOf([&] { GltfFile::fromText(json.substr(0, 50)); }), "no error");
-}
-
-TEST(GltfReader, RejectsBrokenReferences) {
-    const std::pair<const char*, const char*> edits[] = {
-        {R"("indices":2)", R"("indices":3)"},
-        {R"("indices":2)", R"("indices":0)"},
-        {R"("byteLength":12)", R"("byteLength":13)"},
-        {R"("byteStride":16)", R"("byteStride":8)"},
-        {R"("count":6)", R"("count":7)"},
-        {R"("count":4,"type":"VEC4")", R"("count":3,"type":"VEC4")"},
-        {R"("children":[0])", R"("children":[1])"},
-        {R"("children":[0])", R"("children":[2])"},
-    };
-    for (const auto& [from, to] : edits) {
-        std::string json = quadJson;
-        json.replace(json.find(from), std::strlen(from), to);
-        const Bytes bytes = makeGlb(padded(json), quadBytes());
-        const auto read = [&] { statisticsOf(GltfFile::fromBinary(bytes)); };
-        EXPECT_NE(errorOf(read), "no error") << to;
-    }
-}
-
-TEST(GltfReader, FindsSideFilesByDecodedName) {
-    const std::filesystem::path folder =
-        std::filesystem::path(testing::TempDir()) / "gltf_reader side files";
-    std::filesystem::create_directories(folder);
-    for (const char* name : {"a b.bin", "a%2b.bin"}) {
-        std::ofstream(folder / name) << name[1];
-    }
-    const auto load = [&](const std::string& uri) {
-        const GltfFile file =
-            GltfFile::fromText(R"({"buffers":[{"byteLength":1,"uri":")" + uri +
-                                   R"("}],"bufferViews":[{"buffer":0,"byteLength":1}]})",
-                               folder);
-        return static_cast<char>(file.bufferView(0)[0]);
-    };
-    EXPECT_EQ(load("a%20b.bin"), ' ');
-    EXPECT_EQ(load("a b.bin"), ' ');
-    EXPECT_EQ(load("a%2b.bin"), '%');
-    EXPECT_NE(errorOf([&] { load("none.bin"); }), "no error");
-    EXPECT_NE(errorOf([&] { load("."); }), "no error");
-    std::filesystem::remove_all(folder);
-}
-
-TEST(GltfReader, CountsByMode) {
-    // Five corners of a flat arc, so that strips and fans have triangles of both parities.
-    Primitive primitive;
-    primitive.indices = {0, 1, 2, 3, 4};
-    using Triangles = std::vector<std::array<uint32_t, 3>>;
-    const std::pair<int, Triangles> rows[] = {
-        {-1, {}},
-        {0, {}},
-        {1, {}},
-        {4, {{0, 1, 2}}},
-        {5, {{0, 1, 2}, {1, 3, 2}, {2, 3, 4}}},
-        {6, {{0, 1, 2}, {0, 2, 3}, {0, 3, 4}}},
-    };
-    for (const auto& [mode, triangles] : rows) {
-        primitive.mode = mode;
-        EXPECT_EQ(primitive.triangles(), triangles) << mode;
-    }
-    // points, lines, loop, strip
-    const std::pair<size_t, size_t> counts[] = {{6, 0}, {0, 3}, {0, 6}, {0, 5}};
-    for (size_t mode = 0; mode < std::size(counts); ++mode) {
-        std::string json = quadJson;
-        json.replace(json.find(R"("indices":2)"), 11,
-                     R"("indices":2,"mode":)" + std::to_string(mode));
-        const Totals drawn =
-            statisticsOf(GltfFile::fromBinary(makeGlb(padded(json), quadBytes()))).stored;
-        EXPECT_EQ(drawn.points, counts[mode].first) << mode;
-        EXPECT_EQ(drawn.lines, counts[mode].second) << mode;
-        EXPECT_TRUE(drawn.triangleBounds.isEmpty());
-        EXPECT_EQ(drawn.bounds.max, (Vector{3, 4, 0}));
-    }
 }
 
 TEST(GltfReader, ReportsWhatDeclarationsGetWrong) {
@@ -344,17 +189,6 @@ TEST(GltfReader, DecodesDraco) {
     ASSERT_EQ(faults.size(), 1U);
     EXPECT_EQ(faults[0].kind, "draco-count");
     EXPECT_EQ(faults[0].text, "/accessors/2: declared 15 elements, the stream has 12");
-    for (size_t cut = 4; cut < stream.size(); cut += 4) {
-        Bytes shorter(stream.begin(), stream.end() - static_cast<ptrdiff_t>(cut));
-        std::string text = json;
-        for (size_t at = text.find(length); at != std::string::npos; at = text.find(length)) {
-            text.replace(at, length.size(), std::to_string(shorter.size()) + " ");
-        }
-        EXPECT_NE(
-            errorOf([&] { GltfFile::fromBinary(makeGlb(padded(text), shorter)).primitive(0, 0); }),
-            "no error")
-            << cut;
-    }
 }
 
 } // namespace
