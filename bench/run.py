@@ -39,6 +39,10 @@ def times_data(run):
     return run["peak"] / run["bytes"]
 
 
+def nanoseconds_an_item(run):
+    return run["seconds"] * 1e9 / run["items"]
+
+
 @dataclass
 class Row:
     name: str  # what --rows is matched with
@@ -70,6 +74,25 @@ ROWS = [
         "bench_mesh", "mesh/index", times_floor),
     Row("mesh/triangulate", "triangulation, 200,000 polygons", "x triangulator", 1.3, 1.1,
         "bench_mesh", "mesh/triangulate", times_floor),
+    # No goals beyond: the value is what is asked for.
+    Row("picture/png-load", "PNG of 2048 x 2048 to a picture", "x libpng", 1.1, 1.1,
+        "bench_picture", "picture/png-load", times_floor),
+    Row("picture/jpeg-load", "JPEG of 2048 x 2048 to a picture", "x libjpeg", 1.1, 1.1,
+        "bench_picture", "picture/jpeg-load", times_floor),
+    Row("picture/jpeg-save", "picture of 2048 x 2048 to JPEG", "x libjpeg", 1.05, 1.05,
+        "bench_picture", "picture/jpeg-save", times_floor),
+    Row("picture/resize", "4096 x 4096 RGB halved by Kaiser", "x convolution", 2.5, 2.5,
+        "bench_picture", "picture/resize", times_floor),
+    Row("picture/resize-time", "the same", "ns a pixel", 16.7, 16.7,
+        "bench_picture", "picture/resize", nanoseconds_an_item),
+    Row("picture/resize-memory", "the same, peak", "x pictures + 16 MiB", 1.0, 1.0,
+        "bench_picture", "picture/resize-memory", times_data_beyond_program, runs=1),
+    Row("picture/format", "4096 x 4096, RGB to RGBA and back", "x memcpy", 3.0, 3.0,
+        "bench_picture", "picture/convert-format", times_floor),
+    Row("picture/type", "4096 x 4096, 8 to 16 bits and back", "x memcpy", 3.0, 3.0,
+        "bench_picture", "picture/convert-type", times_floor),
+    Row("picture/normal-map", "4096 x 4096 heights", "ns a pixel", 16.7, 16.7,
+        "bench_picture", "picture/normal-map", nanoseconds_an_item),
     Row("host/time", "program, 32 triangles, PLY", "ms", 30, 10,
         "bench_host", "host/ply", milliseconds),
     Row("host/memory", "program, 32 triangles, PLY, peak", "MiB", 24, 16,
@@ -100,7 +123,7 @@ def summary(row, runs):
 
     A ratio is that of the medians: what disturbs one run counts in neither of them."""
     single = [row.value(run) for run in runs]
-    keys = [key for key in ("seconds", "floor", "peak", "bytes") if key in runs[0]]
+    keys = [key for key in ("seconds", "floor", "peak", "bytes", "items") if key in runs[0]]
     medians = {key: statistics.median(run[key] for run in runs) for key in keys}
     return row.value(medians), min(single), max(single)
 

@@ -19,6 +19,6 @@ install_packages() {
 
 build_packages=(
     g++ cmake ninja-build pkg-config
-    rapidjson-dev libdraco-dev libxxhash-dev libgeos-dev libassimp-dev
+    libpng-dev libjpeg62-turbo-dev rapidjson-dev libdraco-dev libxxhash-dev libgeos-dev libassimp-dev
     libgtest-dev libgmock-dev libbenchmark-dev
 )

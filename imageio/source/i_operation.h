@@ -1,0 +1,16 @@
+#pragma once
+
+#include "i_image.h"
+
+/// What the operations on pictures share.
+namespace iio {
+
+/// True if `image` has pixels; else a message that names the operation, as "Image::resize()".
+bool requirePixels(const Image& image, const char* operation);
+
+/// A new picture of that size, format and type that takes attributes, path and info of `source`
+/// along, a cube map if that is one. Null where its pixels could not be allocated.
+ref<Image> makeLike(const Image& source, u32 width, u32 height, u32 byteAlignment, u8 format,
+                    u8 type);
+
+} // namespace iio
