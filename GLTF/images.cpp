@@ -2,6 +2,7 @@
 
 #include "GLTF/json_writer.h"
 
+#include "b_byte_order.h"
 #include "stream/b_fs.h"
 
 #include <cstdio>
@@ -69,18 +70,11 @@ string mimeTypeOf(const u8* data, i32 byteLength, const string& fileExtension) {
     return "image/" + fileExtension;
 }
 
-i64 bigEndian16(const u8* at) {
-    return i64(at[0]) << 8 | at[1];
-}
-
-i64 bigEndian32(const u8* at) {
-    return bigEndian16(at) << 16 | bigEndian16(at + 2);
-}
-
 Image::Dimensions pngDimensions(const u8* data, i64 byteLength) {
     if (byteLength < 24)
         return {};
-    const i64 width = bigEndian32(data + 16), height = bigEndian32(data + 20);
+    const i64 width = base::readBigEndian<base::u32>(data + 16);
+    const i64 height = base::readBigEndian<base::u32>(data + 20);
     if (std::max(width, height) > std::numeric_limits<i32>::max())
         return {};
     return {static_cast<i32>(width), static_cast<i32>(height)};
@@ -90,14 +84,14 @@ Image::Dimensions pngDimensions(const u8* data, i64 byteLength) {
 Image::Dimensions jpegDimensions(const u8* data, i64 byteLength) {
     i64 position = 4; // the length of the first segment
     while (position + 2 <= byteLength) {
-        const i64 next = position + bigEndian16(data + position);
+        const i64 next = position + base::readBigEndian<base::u16>(data + position);
         if (next + 1 >= byteLength)
             break;
         if (data[next + 1] == 192 || data[next + 1] == 194) {
             if (next + 9 > byteLength)
                 break;
-            return {static_cast<i32>(bigEndian16(data + next + 7)),
-                    static_cast<i32>(bigEndian16(data + next + 5))};
+            return {static_cast<i32>(base::readBigEndian<base::u16>(data + next + 7)),
+                    static_cast<i32>(base::readBigEndian<base::u16>(data + next + 5))};
         }
         position = next + 2;
     }

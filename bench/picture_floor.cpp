@@ -4,11 +4,9 @@
 
 #include <algorithm>
 #include <cmath>
-#include <csetjmp>
 #include <cstdio>
 #include <cstring>
 #include <random>
-#include <stdexcept>
 
 #include <jpeglib.h>
 #include <png.h>

@@ -8,7 +8,7 @@ namespace bench {
 /// A picture with the frequencies of a photograph: smooth ground, edges, and grain.
 base::ref<iio::Image> makePhotograph(base::u32 width, base::u32 height, base::u8 format);
 
-/// Decodes all rows of a file of 8 bits a component into one new block. Throws if it can't.
+/// Decodes all rows of a file of 8 bits a component, which must be whole, into one new block.
 base::vector<base::u8> decodePng(const base::vector<base::u8>& file);
 base::vector<base::u8> decodeJpeg(const base::vector<base::u8>& file);
 /// Compresses the rows of an RGB picture with the library's settings for `quality`.

@@ -2,8 +2,8 @@
 #include "picture_floor.h"
 
 #include "b_filter.h"
-#include "i_image_algo.h"
-#include "i_plugin.h"
+#include "i_file.h"
+#include "i_normal_map.h"
 #include "stream/b_stream_workers.h"
 
 #include <algorithm>

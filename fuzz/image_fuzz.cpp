@@ -1,4 +1,4 @@
-#include "i_plugin.h"
+#include "i_file.h"
 
 #include "stream/b_stream_workers.h"
 

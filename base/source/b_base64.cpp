@@ -1,5 +1,7 @@
 #include "b_base64.h"
 
+#include "b_byte_order.h"
+
 #include <array>
 #include <bit>
 #include <cstring>
@@ -29,18 +31,14 @@ void putQuad(u32 bits, char* out) {
     std::memcpy(out + 2, &pairs[bits & 0xFFF], 2);
 }
 
-u32 bigEndian32(const u8* bytes) {
-    return u32{bytes[0]} << 24 | u32{bytes[1]} << 16 | u32{bytes[2]} << 8 | bytes[3];
-}
-
 } // namespace
 
 void base64Encode(const u8* bytes, std::size_t byteCount, char* out) {
     // Twelve bytes a turn, as three words: the compiler turns each into one swapped load.
     for (; byteCount >= 12; bytes += 12, byteCount -= 12, out += 16) {
-        const u32 a = bigEndian32(bytes);
-        const u32 b = bigEndian32(bytes + 4);
-        const u32 c = bigEndian32(bytes + 8);
+        const u32 a = readBigEndian<u32>(bytes);
+        const u32 b = readBigEndian<u32>(bytes + 4);
+        const u32 c = readBigEndian<u32>(bytes + 8);
         putQuad(a >> 8, out);
         putQuad((a << 16 | b >> 16) & 0xFFFFFF, out + 4);
         putQuad((b << 8 | c >> 24) & 0xFFFFFF, out + 8);

@@ -64,7 +64,7 @@ public:
     void create(u32 width, u32 height, u32 depth, u32 byteAlignment, u8 format, u8 type);
     /// The same for six faces of width x height, in the order +x, -x, +y, -y, +z, -z.
     void createCube(u32 width, u32 height, u32 byteAlignment, u8 format, u8 type);
-    /// Back to what the default constructor makes.
+    /// Drops pixels and levels; size and layout become those of a default picture.
     void clear();
 
     u32 width() const noexcept { return width_; }
@@ -197,7 +197,9 @@ private:
     void setSize(u32 width, u32 height, u32 depth, u32 byteAlignment, u8 format, u8 type,
                  bool isCube);
     void allocate();
-    void copyLevels(const Image& other);
+    void copy(const Image& other, bool copiesPixels);
+    void createAny(u32 width, u32 height, u32 depth, u32 byteAlignment, u8 format, u8 type,
+                   bool isCube);
     void updatePitch() noexcept;
 
     bool fromFile_ = false;

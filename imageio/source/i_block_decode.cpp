@@ -2,6 +2,8 @@
 
 #include "i_operation.h"
 
+#include "b_byte_order.h"
+
 #include <algorithm>
 #include <cstring>
 
@@ -10,10 +12,6 @@ namespace iio {
 namespace {
 
 using Color = u8[4];
-
-u32 readWord(const u8* bytes) {
-    return u32(bytes[0] | bytes[1] << 8);
-}
 
 /// The bits are repeated below, so the greatest value of 5 or 6 bits is 255.
 void expandColor(u32 packed, Color& out) {
@@ -40,7 +38,8 @@ void mix(const Color& a, u32 weightA, const Color& b, u32 weightB, Color& out) {
 /// Component 3 is `blackAlpha` for that black and `alpha` for all else.
 void decodeColors(const u8* block, bool hasThreeColorMode, u8 alpha, u8 blackAlpha,
                   BlockPixels& out) {
-    const u32 first = readWord(block), second = readWord(block + 2);
+    const u32 first = base::readLittleEndian<u16>(block);
+    const u32 second = base::readLittleEndian<u16>(block + 2);
     Color palette[4] = {{0, 0, 0, alpha}, {0, 0, 0, alpha}, {0, 0, 0, alpha}, {0, 0, 0, alpha}};
     expandColor(first, palette[0]);
     expandColor(second, palette[1]);
@@ -69,9 +68,7 @@ void decodeRamp(const u8* block, u32 component, BlockPixels& out) {
         palette[6] = 0;
         palette[7] = 255;
     }
-    u64 indices = 0;
-    for (u32 i = 0; i < 6; ++i)
-        indices |= u64(block[2 + i]) << i * 8;
+    const u64 indices = base::readLittleEndian<u64>(block + 2, 6);
     for (u32 i = 0; i < 16; ++i)
         out.components[i][component] = palette[indices >> i * 3 & 7];
 }

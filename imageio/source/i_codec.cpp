@@ -49,10 +49,10 @@ bool startsWith(const base::Stream& stream, std::span<const u8> bytes) {
            std::equal(bytes.begin(), bytes.end(), found.begin());
 }
 
-BlockReader::BlockReader(const base::Stream& stream)
+StreamReader::StreamReader(const base::Stream& stream)
     : stream_(quietHandle(stream)), block_(blockBytes) {}
 
-bool BlockReader::fill() noexcept {
+bool StreamReader::fill() noexcept {
     begin_ = end_ = 0;
     try {
         end_ = stream_.read(block_.data(), block_.size());
@@ -62,7 +62,7 @@ bool BlockReader::fill() noexcept {
     return end_ != 0;
 }
 
-bool BlockReader::read(u8* target, std::size_t byteCount) noexcept {
+bool StreamReader::read(u8* target, std::size_t byteCount) noexcept {
     while (byteCount != 0) {
         if (size() == 0 && !fill())
             return false;
@@ -75,10 +75,10 @@ bool BlockReader::read(u8* target, std::size_t byteCount) noexcept {
     return true;
 }
 
-BlockWriter::BlockWriter(const base::Stream& stream)
+StreamWriter::StreamWriter(const base::Stream& stream)
     : stream_(quietHandle(stream)), block_(blockBytes) {}
 
-bool BlockWriter::writeBlock(std::size_t byteCount) noexcept {
+bool StreamWriter::writeBlock(std::size_t byteCount) noexcept {
     try {
         return stream_.write(block_.data(), byteCount) == byteCount;
     } catch (...) {
@@ -87,7 +87,7 @@ bool BlockWriter::writeBlock(std::size_t byteCount) noexcept {
     }
 }
 
-bool BlockWriter::append(const u8* bytes, std::size_t byteCount) noexcept {
+bool StreamWriter::append(const u8* bytes, std::size_t byteCount) noexcept {
     while (byteCount != 0) {
         const std::size_t count = std::min(byteCount, size() - used_);
         std::memcpy(data() + used_, bytes, count);
@@ -100,11 +100,11 @@ bool BlockWriter::append(const u8* bytes, std::size_t byteCount) noexcept {
     return true;
 }
 
-bool BlockWriter::flush() noexcept {
+bool StreamWriter::flush() noexcept {
     return writeBlock(std::exchange(used_, 0));
 }
 
-const char* BlockWriter::fault() const noexcept {
+const char* StreamWriter::fault() const noexcept {
     return fault_.empty() ? "the file could not be written whole" : fault_.c_str();
 }
 

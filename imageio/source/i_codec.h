@@ -17,9 +17,9 @@ bool startsWith(const base::Stream& stream, std::span<const u8> bytes);
 
 /// Reads a stream in large blocks, from its position on; that stands somewhere behind the bytes
 /// that were asked for then.
-class BlockReader {
+class StreamReader {
 public:
-    explicit BlockReader(const base::Stream& stream);
+    explicit StreamReader(const base::Stream& stream);
 
     /// The bytes at hand that were not consumed yet.
     const u8* data() const noexcept { return block_.data() + begin_; }
@@ -41,9 +41,9 @@ private:
 };
 
 /// Collects what is written and hands it to a stream in large blocks.
-class BlockWriter {
+class StreamWriter {
 public:
-    explicit BlockWriter(const base::Stream& stream);
+    explicit StreamWriter(const base::Stream& stream);
 
     /// The block itself, for libraries that fill it on their own.
     u8* data() noexcept { return block_.data(); }

@@ -182,6 +182,16 @@ i32 findGammaMode(const Image& source, u8 targetType) {
     return fromLinear ? Image::gammaEncode : Image::gammaDecode;
 }
 
+/// What the picture says of itself must hold once a curve was applied, or the next conversion or
+/// a file would apply it again.
+void renameColorSpace(Image& image, i32 gammaMode) {
+    const base::name_id name = imageAttributes().n_ColorSpace;
+    const string* colorSpace = image.attributes().findAttribute<string>(name);
+    if (colorSpace && *colorSpace != "ignore")
+        image.attributes().attribute<string>(name) =
+            gammaMode == Image::gammaEncode ? "srgb" : "linear";
+}
+
 ref<Image> reject(const char* what) {
     base::log().log(base::logIO, base::logError, "Image::convertType(): unsupported {}.", what);
     return {};
@@ -209,6 +219,8 @@ ref<Image> Image::convertType(u8 targetType, i32, i32 gammaMode) {
     const bool hasCurve = gammaMode == gammaEncode || gammaMode == gammaDecode;
     if (hasCurve || !convertBytesAndShorts(*this, *target))
         convertRows(*this, *target, findReader(type_, gammaMode), findWriter(targetType));
+    if (hasCurve)
+        renameColorSpace(*target, gammaMode);
     return target;
 }
 

@@ -1,5 +1,6 @@
-#include "i_image_algo.h"
-#include "i_plugin.h"
+#include "i_cubemap.h"
+
+#include "i_file.h"
 
 #include "b_log.h"
 #include "stream/b_fs.h"
@@ -8,6 +9,7 @@
 #include <array>
 #include <cstring>
 #include <optional>
+#include <tuple>
 
 namespace iio {
 
@@ -17,6 +19,11 @@ using Faces = std::array<const Image*, 6>;
 
 bool hasPicture(const Image* face) {
     return face && face->hasPixels() && face->kind() == Image::kind2D;
+}
+
+auto layoutOf(const Image& image) {
+    return std::tuple(image.width(), image.height(), image.format(), image.type(),
+                      image.byteAlignment());
 }
 
 /// What keeps `faces` from being one cube; null if nothing does.
@@ -106,6 +113,13 @@ string findFace(const Marker& marker, u32 n, const string& name, const vector<st
     return {};
 }
 
+ref<Image> loadFaces(const string& folder, const std::array<string, 6>& names) {
+    std::array<ref<Image>, 6> faces;
+    std::ranges::transform(names, faces.begin(),
+                           [&](const string& name) { return loadImage(folder + name); });
+    return createCubemap(faces[0], faces[1], faces[2], faces[3], faces[4], faces[5]);
+}
+
 } // namespace
 
 ref<Image> createCubemap(const ref<Image>& posX, const ref<Image>& negX, const ref<Image>& posY,
@@ -124,11 +138,10 @@ ref<Image> createCubemap(const ref<Image>& posX, const ref<Image>& negX, const r
         Faces levels;
         std::ranges::transform(faces, levels.begin(),
                                [&](const Image* face) { return face->level(level); });
-        // Compressed levels of one block are not two-dimensional any more.
+        // Compressed levels of one block are not two-dimensional any more, so less is asked for.
         const bool areAlike = std::ranges::all_of(levels, [&](const Image* face) {
-            return face && face->hasPixels() && levels[0] &&
-                   face->memorySize() == levels[0]->memorySize() &&
-                   face->format() == levels[0]->format() && face->type() == levels[0]->type();
+            return face && levels[0] && face->hasPixels() && !face->isCube() &&
+                   face->depth() == 1 && layoutOf(*face) == layoutOf(*levels[0]);
         });
         if (areAlike)
             copyFaces(levels, *cube->level(level, true));
@@ -136,38 +149,34 @@ ref<Image> createCubemap(const ref<Image>& posX, const ref<Image>& negX, const r
     return cube;
 }
 
-static ref<Image> loadFaces(const string& folder, const std::array<string, 6>& names) {
-    std::array<ref<Image>, 6> faces;
-    std::ranges::transform(names, faces.begin(),
-                           [&](const string& name) { return loadImage(folder + name); });
-    return createCubemap(faces[0], faces[1], faces[2], faces[3], faces[4], faces[5]);
-}
-
 ref<Image> loadCubemap(const string& path) {
     const string folder = base::fs::folder(path), name = base::fs::fileName(path);
     const vector<string> files = base::fs::master().findFiles(folder, "*");
     // A name may hold a word of one set by chance and be marked by another one, so that the first
     // set with all six files counts.
-    string missing;
+    vector<string> missing; ///< of the first set
     for (const MarkerSet& set : markerSets) {
         const std::optional<Marker> marker = findLast(set, name);
         if (!marker)
             continue;
         std::array<string, 6> faces;
+        vector<string> missingHere;
         for (u32 n = 0; n < 6; ++n) {
             faces[n] = findFace(*marker, n, name, files);
-            if (faces[n].empty() && missing.empty())
-                missing = withWord(*marker, set.words[n], name);
+            if (faces[n].empty())
+                missingHere.push_back(withWord(*marker, set.words[n], name));
         }
-        if (std::ranges::count(faces, string()) == 0)
+        if (missingHere.empty())
             return loadFaces(folder, faces);
+        if (missing.empty())
+            missing.swap(missingHere);
     }
     if (missing.empty())
         base::log().log(base::logIO, base::logInformation, "Unrecognized cubemap format '{}'!",
                         path);
-    else
+    for (const string& face : missing)
         base::log().log(base::logIO, base::logInformation, "Cubemap subimage '{}' not found!",
-                        folder + missing);
+                        folder + face);
     return {};
 }
 

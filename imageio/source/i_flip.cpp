@@ -1,6 +1,7 @@
 #include "i_block_decode.h"
 #include "i_operation.h"
 
+#include "b_byte_order.h"
 #include "b_log.h"
 
 #include <algorithm>
@@ -53,9 +54,8 @@ constexpr BlockFields blockFields[] = {
 void reorderField(u8* block, const PixelField& field, const BlockOrder& order) {
     const u32 byteCount = field.bitCount * 2;
     const u64 mask = (u64(1) << field.bitCount) - 1;
-    u64 before = 0, after = 0;
-    for (u32 i = 0; i < byteCount; ++i)
-        before |= u64(block[field.byteOffset + i]) << i * 8;
+    const u64 before = base::readLittleEndian<u64>(block + field.byteOffset, byteCount);
+    u64 after = 0;
     for (u32 i = 0; i < 16; ++i)
         after |= (before >> order[i] * field.bitCount & mask) << i * field.bitCount;
     for (u32 i = 0; i < byteCount; ++i)

@@ -28,66 +28,62 @@ Image::Image(u32 width, u32 height, u32 depth, u32 byteAlignment, u8 format, u8 
     create(width, height, depth, byteAlignment, format, type);
 }
 
-Image::Image(const Image& other)
-    : base::RefCntAtomic(), ImageTypes(other), info(other.info), fromFile_(other.fromFile_),
-      colorTransform_(other.colorTransform_), path_(other.path_) {
-    setSize(other.width_, other.height_, other.depth_, other.byteAlignment_, other.format_,
-            other.type_, other.isCube());
-    pitch_ = other.pitch_;
-    std::copy(std::begin(other.state_), std::end(other.state_), state_);
-    if (other.data_) {
-        allocate();
-        if (data_)
-            std::memcpy(data_->data(), other.data(), std::min(data_->size(), other.data_->size()));
-    }
-    copyLevels(other);
+Image::Image(const Image& other) : base::RefCntAtomic(), ImageTypes(other) {
+    copy(other, true);
 }
 
 Image& Image::operator=(const Image& other) {
-    if (this == &other)
-        return *this;
+    if (this != &other)
+        copy(other, data_ && data_->ownsMemory());
+    return *this;
+}
+
+/// `other` may be one of this picture's levels: nothing of this one is let go before all is copied.
+void Image::copy(const Image& other, bool copiesPixels) {
+    vector<ref<Image>> levels;
+    levels.reserve(other.levels_.size());
+    for (const ref<Image>& level : other.levels_)
+        levels.push_back(level ? base::makeRef<Image>(*level) : ref<Image>());
+    const ref<base::Buffer> pixels = other.data_;
+
     info = other.info;
     fromFile_ = other.fromFile_;
     colorTransform_ = other.colorTransform_;
     path_ = other.path_;
-    const bool copies = data_ && data_->ownsMemory() && other.data_;
-    setSize(other.width_, other.height_, other.depth_, other.byteAlignment_, other.format_,
-            other.type_, other.isCube());
+    width_ = other.width_;
+    height_ = other.height_;
+    depth_ = other.depth_;
     pitch_ = other.pitch_;
+    byteAlignment_ = other.byteAlignment_;
+    format_ = other.format_;
+    type_ = other.type_;
     std::copy(std::begin(other.state_), std::end(other.state_), state_);
-    if (copies) {
+    cubeFlag_ = other.cubeFlag_;
+    data_ = pixels;
+    if (pixels && copiesPixels) {
         allocate();
         if (data_)
-            std::memcpy(data_->data(), other.data(), std::min(data_->size(), other.data_->size()));
-    } else {
-        data_ = other.data_;
+            std::memcpy(data_->data(), pixels->data(), std::min(data_->size(), pixels->size()));
     }
-    copyLevels(other);
-    return *this;
+    levels_.swap(levels);
 }
 
 Image::~Image() = default;
 
-void Image::copyLevels(const Image& other) {
-    levels_.clear();
-    levels_.reserve(other.levels_.size());
-    for (const ref<Image>& level : other.levels_)
-        levels_.push_back(level ? base::makeRef<Image>(*level) : ref<Image>());
-}
-
 void Image::create(u32 width, u32 height, u32 depth, u32 byteAlignment, u8 format, u8 type) {
-    if (width == 0)
-        throw std::runtime_error("Can't create an empty image!");
-    levels_.clear();
-    setSize(width, std::max(height, 1u), std::max(depth, 1u), byteAlignment, format, type, false);
-    allocate();
+    createAny(width, height, depth, byteAlignment, format, type, false);
 }
 
 void Image::createCube(u32 width, u32 height, u32 byteAlignment, u8 format, u8 type) {
+    createAny(width, height, 1, byteAlignment, format, type, true);
+}
+
+void Image::createAny(u32 width, u32 height, u32 depth, u32 byteAlignment, u8 format, u8 type,
+                      bool isCube) {
     if (width == 0)
         throw std::runtime_error("Can't create an empty image!");
     levels_.clear();
-    setSize(width, std::max(height, 1u), 1, byteAlignment, format, type, true);
+    setSize(width, std::max(height, 1u), std::max(depth, 1u), byteAlignment, format, type, isCube);
     allocate();
 }
 
@@ -122,6 +118,7 @@ void Image::updatePitch() noexcept {
 }
 
 void Image::allocate() {
+    data_.reset();
     const u64 byteCount = memorySize();
     if (byteCount <= greatestByteSize)
         data_ = base::Buffer::allocate(byteCount);
@@ -172,7 +169,7 @@ bool Image::isValid() const {
 }
 
 u8* Image::slice(u32 z) noexcept {
-    return data_ && !isCube() ? data() + u64(pitch_) * height_ * z : nullptr;
+    return hasPixels() && !isCube() ? data() + u64(pitch_) * height_ * z : nullptr;
 }
 
 u8* Image::face(u32 n) noexcept {
@@ -180,7 +177,7 @@ u8* Image::face(u32 n) noexcept {
 }
 
 const u8* Image::face(u32 n) const noexcept {
-    return data_ && kind() == kindCube && n < 6 ? data() + memorySize() / 6 * n : nullptr;
+    return hasPixels() && kind() == kindCube && n < 6 ? data() + memorySize() / 6 * n : nullptr;
 }
 
 bool Image::getRow(float* values, u32 y, u32 z) const {
@@ -239,77 +236,6 @@ void Image::setColorTransform(const ref<ColorTransform>& transform) {
     for (const ref<Image>& level : levels_) {
         if (level)
             level->setColorTransform(transform);
-    }
-}
-
-namespace {
-
-/// True if component `index` of a pixel of the rows is below `full`.
-template <class T>
-bool findBelow(const Image& image, u32 index, T full) {
-    const u32 channels = image.channelCount();
-    for (u64 y = 0; y < image.rowCount(); ++y) {
-        const T* alpha = reinterpret_cast<const T*>(image.row(y)) + index;
-        for (u32 x = 0; x < image.width(); ++x, alpha += channels) {
-            if (*alpha < full)
-                return true;
-        }
-    }
-    return false;
-}
-
-template <class T>
-bool findNegative(const Image& image) {
-    const u64 count = u64(image.width()) * image.channelCount();
-    for (u64 y = 0; y < image.rowCount(); ++y) {
-        const T* values = reinterpret_cast<const T*>(image.row(y));
-        if (std::any_of(values, values + count, [](T value) { return value < T(); }))
-            return true;
-    }
-    return false;
-}
-
-} // namespace
-
-bool Image::checkTransparency() const {
-    if (!hasAlpha())
-        return false;
-    if (isCompressed())
-        return true;
-    if (!requirePixels(*this, "Image::checkTransparency()"))
-        return false;
-    const auto index = static_cast<u32>(alphaIndex());
-    switch (type_) {
-    case IT_UNSIGNED_BYTE:
-        return findBelow<u8>(*this, index, 255);
-    case IT_UNSIGNED_SHORT:
-        return findBelow<u16>(*this, index, 65535);
-    case IT_UNSIGNED_INT:
-        return findBelow<u32>(*this, index, 4294967295u);
-    case kFloat:
-        return findBelow<float>(*this, index, 1.0f);
-    default:
-        base::log().log(base::logIO, base::logError,
-                        "Image::checkTransparency(): unsupported image type(). Types supported are "
-                        "IT_UNSIGNED_BYTE, IT_UNSIGNED_SHORT, IT_UNSIGNED_INT, kFloat.");
-        return false;
-    }
-}
-
-bool Image::hasNegativeValues() const {
-    switch (type_) {
-    case IT_BYTE:
-    case IT_SHORT:
-    case IT_INT:
-        return true;
-    case kHalf:
-        return requirePixels(*this, "Image::hasNegativeValues()") && findNegative<half>(*this);
-    case kFloat:
-        return requirePixels(*this, "Image::hasNegativeValues()") && findNegative<float>(*this);
-    case kDouble:
-        return requirePixels(*this, "Image::hasNegativeValues()") && findNegative<double>(*this);
-    default:
-        return false;
     }
 }
 

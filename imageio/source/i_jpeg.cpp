@@ -1,5 +1,6 @@
 #include "i_jpeg.h"
 
+#include "i_fitting.h"
 #include "i_formats.h"
 #include "i_operation.h"
 
@@ -53,6 +54,8 @@ void JpegErrors::fail(const char* text) {
     std::longjmp(back, 1);
 }
 
+namespace {
+
 class ImageioJPG final : public ImageFormat {
 public:
     using ImageFormat::ImageFormat;
@@ -73,43 +76,30 @@ public:
     }
 
     bool save(base::Stream& stream, Image& image) override {
+        Fitting fitting(image, stream);
         if (image.width() < 1 || image.height() < 1) {
             base::log().log(base::logIO, base::logError,
-                            "jpeg save |{}| attempt to save image with zero size!", stream.name());
+                            "jpeg save |{}| attempt to save image with zero size!", fitting.name());
             return false;
         }
-        if (!requirePixels(image, "jpeg save"))
-            return false;
-        ref<Image> converted;
-        const Image* fitting = makeFitting(stream, image, converted);
-        return fitting && writeJpeg(stream, *fitting, makeSettings(image.attributes()));
+        return requirePixels(image, base::format("jpeg save |{}|", fitting.name())) &&
+               convert(fitting) && writeJpeg(stream, *fitting, makeSettings(image.attributes()));
     }
 
 private:
-    /// The picture, or what `converted` then holds: one that a file can hold, but for its alpha.
-    /// Null, with a message, if it can't be brought there.
-    static const Image* makeFitting(const base::Stream& stream, Image& image,
-                                    ref<Image>& converted) {
-        Image* fitting = &image;
-        const auto replace = [&](const ref<Image>& made, const char* message) {
-            if (!made)
-                base::log().log(base::logIO, base::logError, message, stream.name());
-            converted = made;
-            fitting = made.get();
-        };
-        if (image.type() != ImageTypes::IT_UNSIGNED_BYTE)
-            replace(image.convertType(ImageTypes::IT_UNSIGNED_BYTE),
-                    "jpeg save |{}| could not convert image to unsidned byte.");
-        if (!fitting)
-            return nullptr;
+    /// To what a file can hold, but for alpha.
+    static bool convert(Fitting& fitting) {
+        if (!fitting.toType(ImageTypes::IT_UNSIGNED_BYTE,
+                            "jpeg save |{}| could not convert image to unsidned byte."))
+            return false;
         // The compressor takes the other formats of three and four components as they are.
         if (fitting->format() == ImageTypes::kLuminanceAlpha)
-            replace(fitting->convertFormat(ImageTypes::kLuminance),
-                    "jpeg save |{}| could not convert image to greyscale.");
-        else if (fitting->format() == ImageTypes::kRG)
-            replace(fitting->convertFormat(ImageTypes::kRGB),
-                    "jpeg save |{}| could not convert image to RGB.");
-        return fitting;
+            return fitting.toFormat(ImageTypes::kLuminance,
+                                    "jpeg save |{}| could not convert image to greyscale.");
+        if (fitting->format() == ImageTypes::kRG)
+            return fitting.toFormat(ImageTypes::kRGB,
+                                    "jpeg save |{}| could not convert image to RGB.");
+        return true;
     }
 
     JpegWriteSettings makeSettings(const base::AttribMap& attributes) const {
@@ -141,6 +131,8 @@ private:
             settings.densityY = base::saturate<u8>(*y * factor);
     }
 };
+
+} // namespace
 
 ref<IImageIODesc> describeJPG() {
     return makeFormat<ImageioJPG>("jpeg", "JPEG Image", "jpeg;jpg;jpe;jfif;jif;jfi", 12291);

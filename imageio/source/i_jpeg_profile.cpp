@@ -10,6 +10,8 @@ namespace iio {
 namespace {
 
 constexpr char identifier[] = "ICC_PROFILE"; // Its zero byte belongs to it.
+constexpr char inconsistentCount[] =
+    "jpeg load |{}| inconsistent ICC profile markers count, ignoring...";
 constexpr std::size_t headerBytes = sizeof identifier + 2;
 
 /// The parts by their number, which counts from 1.
@@ -31,7 +33,7 @@ const char* takePart(ProfileParts& profile, const jpeg_marker_struct& marker) {
     if (profile.count == 0)
         profile.count = count;
     if (count != profile.count)
-        return "jpeg load |{}| inconsistent ICC profile markers count, ignoring...";
+        return inconsistentCount;
     if (number == 0 || number > count)
         return "jpeg load |{}| bogus id in the ICC profile marker, ignoring...";
     if (profile.isThere[number])
@@ -52,8 +54,11 @@ bool isWhole(const ProfileParts& profile) {
 } // namespace
 
 vector<u8> joinJpegProfile(jpeg_saved_marker_ptr markers, const string& path) {
+    // Each kind of complaint once, for a file may hold thousands of broken markers.
+    base::set<const char*> said;
     const auto complain = [&](const char* message) {
-        base::log().log(base::logIO, base::logError, message, path);
+        if (said.insert(message).second)
+            base::log().log(base::logIO, base::logError, message, path);
     };
     ProfileParts profile;
     bool isThere = false;
@@ -66,7 +71,7 @@ vector<u8> joinJpegProfile(jpeg_saved_marker_ptr markers, const string& path) {
     }
     vector<u8> bytes;
     if (!isWhole(profile)) {
-        complain("jpeg load |{}| inconsistent ICC profile markers count, ignoring...");
+        complain(inconsistentCount);
         return bytes;
     }
     for (u32 number = 1; number <= profile.count; ++number)

@@ -14,8 +14,12 @@ namespace {
 
 constexpr char operation[] = "jpeg load";
 
-constexpr int greatestScanCount =
-    500; ///< of a progressive picture; more cost time and show nothing
+// Of a progressive picture: scans beyond these cost time and show nothing. A scan goes over all
+// pixels, so together they are limited too.
+constexpr int greatestScanCount = 500;
+constexpr u64 greatestScannedPixels = u64(1) << 33;
+// Coefficients of a progressive picture are all kept, which a short file can ask for as well.
+constexpr long greatestMemory = 1L << 30;
 
 // A block of 64 pixels takes a bit or more, so a byte 512 pixels or fewer. A file that is cut short
 // is read as far as it goes, but what has less than an eighth of this is not worth the memory for
@@ -67,11 +71,15 @@ struct JpegSource : jpeg_source_mgr {
         source.bytes_in_buffer -= left;
     }
 
-    BlockReader reader;
+    StreamReader reader;
 };
 
-void limitScans(j_common_ptr codec) {
-    if (reinterpret_cast<j_decompress_ptr>(codec)->input_scan_number > greatestScanCount)
+void limitScans(j_common_ptr common) {
+    const auto* codec = reinterpret_cast<j_decompress_ptr>(common);
+    const auto scanCount = static_cast<u64>(codec->input_scan_number);
+    const u64 pixelCount = u64(codec->image_width) * codec->image_height;
+    if (scanCount > greatestScanCount ||
+        (scanCount > 1 && scanCount * pixelCount > greatestScannedPixels))
         static_cast<JpegErrors*>(codec->err)->fail("too many scans");
 }
 
@@ -107,6 +115,7 @@ bool open(JpegReadFile& file) {
     bool hasPicture = false;
     const bool isOpen = file.errors.attempt([&] {
         jpeg_create_decompress(&codec);
+        codec.mem->max_memory_to_use = greatestMemory;
         codec.src = &file.source;
         codec.progress = &file.progress;
         jpeg_save_markers(&codec, JPEG_COM, 0xFFFF);

@@ -55,7 +55,7 @@ struct JpegTarget : jpeg_destination_mgr {
         restart();
     }
 
-    BlockWriter writer;
+    StreamWriter writer;
 };
 
 /// A file under way, and what libjpeg holds of it.

@@ -1,4 +1,5 @@
-#include "i_image_algo.h"
+#include "i_normal_map.h"
+
 #include "i_operation.h"
 #include "i_sampler.h"
 
@@ -88,6 +89,7 @@ ref<Image> makeNormalMap(const Image& source, u32 channel, float strength, bool 
         base::makeRef<Image>(width, height, 1u, 1u, u8(Image::kRGB), u8(Image::IT_UNSIGNED_BYTE));
     if (!map->data())
         return {};
+    map->setPath(source.path());
 
     HeightRow above, row, below;
     vector<u8> components(u64(width) * 3);

@@ -4,7 +4,7 @@
 
 namespace iio {
 
-bool requirePixels(const Image& image, const char* operation) {
+bool requirePixels(const Image& image, string_view operation) {
     if (image.hasPixels())
         return true;
     base::log().log(base::logIO, base::logError, "{}: the image has no pixels.", operation);

@@ -6,7 +6,7 @@
 namespace iio {
 
 /// True if `image` has pixels; else a message that names the operation, as "Image::resize()".
-bool requirePixels(const Image& image, const char* operation);
+bool requirePixels(const Image& image, string_view operation);
 
 /// A new picture of that size, format and type that takes attributes, path and info of `source`
 /// along, a cube map if that is one. Null where its pixels could not be allocated.

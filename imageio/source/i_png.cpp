@@ -1,5 +1,6 @@
 #include "i_png.h"
 
+#include "i_fitting.h"
 #include "i_formats.h"
 #include "i_operation.h"
 
@@ -69,8 +70,6 @@ std::optional<PngWriteSettings::Density> makeDensity(u16 unit, double x, double 
     return density;
 }
 
-} // namespace
-
 class ImageioPNG final : public ImageFormat {
 public:
     using ImageFormat::ImageFormat;
@@ -96,15 +95,11 @@ public:
     }
 
     bool save(base::Stream& stream, Image& image) override {
-        if (!requirePixels(image, "png save"))
+        Fitting fitting(image, stream);
+        if (!requirePixels(image, base::format("png save |{}|", fitting.name())) ||
+            !convert(fitting))
             return false;
-        ref<Image> converted;
-        const Image* fitting = makeFitting(stream, image, converted);
-        if (!fitting)
-            return false;
-        // A linear picture was given the sRGB curve with its bytes or shorts.
-        const bool wasEncoded = fitting->type() != image.type() && !image.isCompressed();
-        addColour(image.attributes(), wasEncoded);
+        addColour(fitting->attributes());
         addDescription(image.attributes());
         return writePng(stream, *fitting, settings_);
     }
@@ -116,40 +111,32 @@ private:
         return wantsShort ? ImageTypes::IT_UNSIGNED_SHORT : ImageTypes::IT_UNSIGNED_BYTE;
     }
 
-    /// The picture, or what `converted` then holds: in a format and type that a file can hold.
-    /// Null, with a message, if it can't be brought there.
-    const Image* makeFitting(const base::Stream& stream, Image& image,
-                             ref<Image>& converted) const {
-        Image* fitting = &image;
-        const auto replace = [&](const ref<Image>& made, const char* message) {
-            if (!made)
-                base::log().log(base::logIO, base::logError, message, stream.name());
-            converted = made;
-            fitting = made.get();
-        };
+    /// To a format and type that a file can hold.
+    bool convert(Fitting& fitting) const {
         constexpr const char* formatFault =
             "png save |{}| could not convert image to supported format.";
-        if (image.isCompressed())
-            replace(image.convertFormat(plainFormatOf(image.channelCount())), formatFault);
-        if (fitting && fitting->type() != ImageTypes::IT_UNSIGNED_BYTE &&
-            fitting->type() != ImageTypes::IT_UNSIGNED_SHORT)
-            replace(fitting->convertType(targetTypeOf(*fitting)),
-                    "png save |{}| could not convert image to supported color type.\n");
-        if (fitting && fitting->format() == ImageTypes::kRG)
-            replace(fitting->convertFormat(ImageTypes::kRGB), formatFault);
-        return fitting;
+        if (fitting->isCompressed() &&
+            !fitting.toFormat(plainFormatOf(fitting->channelCount()), formatFault))
+            return false;
+        if (fitting->type() != ImageTypes::IT_UNSIGNED_BYTE &&
+            fitting->type() != ImageTypes::IT_UNSIGNED_SHORT &&
+            !fitting.toType(targetTypeOf(*fitting),
+                            "png save |{}| could not convert image to supported color type.\n"))
+            return false;
+        return fitting->format() != ImageTypes::kRG ||
+               fitting.toFormat(ImageTypes::kRGB, formatFault);
     }
 
-    void addColour(const base::AttribMap& attributes, bool wasEncoded) {
+    void addColour(const base::AttribMap& attributes) {
         const ImageAttributes& names = imageAttributes();
         const string* space = findSetting<string>(names.n_ColorSpace, attributes);
         if (space && *space == "gamma") {
             const float* gamma = findSetting<float>(names.n_Gamma, attributes);
             settings_.gamma =
                 base::saturate<png_fixed_point>(PNG_FP_1 / double(gamma ? *gamma : 2.2f) + 0.5);
-        } else if (space && *space == "linear" && !wasEncoded) {
+        } else if (space && *space == "linear") {
             settings_.gamma = PNG_FP_1;
-        } else if (space && (*space == "srgb" || *space == "linear")) {
+        } else if (space && *space == "srgb") {
             settings_.isSrgb = true;
         }
         settings_.colourProfile = findVecSetting<u8>(names.n_ICCProfile, attributes);
@@ -185,6 +172,8 @@ private:
 
     PngWriteSettings settings_; ///< an object serves one file
 };
+
+} // namespace
 
 ref<IImageIODesc> describePNG() {
     return makeFormat<ImageioPNG>("png", "Portable Network Graphics", "png", 43027);

@@ -1,5 +1,6 @@
 #include "i_png.h"
 
+#include "b_byte_order.h"
 #include "b_log.h"
 #include "b_string_convert.h"
 
@@ -16,6 +17,9 @@ constexpr char operation[] = "png load";
 // libpng merely warns of a chunk beyond its limit of 8 MB, then allocates and clears what it
 // claims. This suffices for that limit and for a row of the longest pictures.
 constexpr std::size_t greatestAllocation = std::size_t(1) << 24;
+
+// Of chunks that are kept, such as texts. Each may unpack to 8 MB, and no picture needs more.
+constexpr u32 greatestChunkCount = 32;
 
 png_voidp allocate(png_structp, std::size_t byteCount) {
     return byteCount <= greatestAllocation ? std::malloc(byteCount) : nullptr;
@@ -39,7 +43,7 @@ struct PngReadFile : base::NonCopyable {
     ~PngReadFile() { png_destroy_read_struct(&png, &info, nullptr); }
 
     base::Stream& stream;
-    BlockReader source;
+    StreamReader source;
     CodecMessages messages;
     png_structp png = nullptr;
     png_infop info = nullptr;
@@ -47,13 +51,9 @@ struct PngReadFile : base::NonCopyable {
 };
 
 void readBytes(png_structp png, png_bytep target, std::size_t byteCount) {
-    auto& source = *static_cast<BlockReader*>(png_get_io_ptr(png));
+    auto& source = *static_cast<StreamReader*>(png_get_io_ptr(png));
     if (!source.read(target, byteCount))
         failPng(png, source.fault().empty() ? "the file ends too early" : source.fault().c_str());
-}
-
-u32 readBigEndian(const u8* bytes) {
-    return u32(bytes[0]) << 24 | u32(bytes[1]) << 16 | u32(bytes[2]) << 8 | u32(bytes[3]);
 }
 
 /// Looks at the sides before libpng does, which has no message of its own for each.
@@ -62,8 +62,8 @@ bool checkSides(PngReadFile& file) {
     file.source.fill();
     if (file.source.size() < sidesAt + 8)
         return true;
-    const u32 width = readBigEndian(file.source.data() + sidesAt);
-    const u32 height = readBigEndian(file.source.data() + sidesAt + 4);
+    const u32 width = base::readBigEndian<u32>(file.source.data() + sidesAt);
+    const u32 height = base::readBigEndian<u32>(file.source.data() + sidesAt + 4);
     const auto check = [&](u32 side, u32 limit, const char* message) {
         if (side != 0 && side <= limit)
             return true;
@@ -80,6 +80,7 @@ bool open(PngReadFile& file) {
     if (!checkSides(file))
         return false;
     const bool isOpen = attemptPng(file.png, [&] {
+        png_set_chunk_cache_max(file.png, greatestChunkCount);
         png_set_read_fn(file.png, &file.source, readBytes);
         png_read_info(file.png, file.info);
         png_set_expand(file.png);

@@ -21,14 +21,14 @@ struct PngWriteFile : base::NonCopyable {
     }
     ~PngWriteFile() { png_destroy_write_struct(&png, &info); }
 
-    BlockWriter target;
+    StreamWriter target;
     CodecMessages messages;
     png_structp png = nullptr;
     png_infop info = nullptr;
 };
 
 void writeBytes(png_structp png, png_bytep bytes, std::size_t byteCount) {
-    auto& target = *static_cast<BlockWriter*>(png_get_io_ptr(png));
+    auto& target = *static_cast<StreamWriter*>(png_get_io_ptr(png));
     if (!target.append(bytes, byteCount))
         failPng(png, target.fault());
 }

@@ -100,9 +100,9 @@ T fromSum(float sum) {
 
 /// Takes rows of components to the numbers that are summed, and sums to components.
 template <class T>
-class RowCodec {
+class RowNumbers {
 public:
-    explicit RowCodec(const Image& image)
+    explicit RowNumbers(const Image& image)
         : transform_(image.colorTransform()), channelCount_(image.channelCount()),
           alphaIndex_(image.alphaIndex()) {}
 
@@ -115,6 +115,19 @@ public:
             if (transform_->converter)
                 transform_->converter->toWorking(numbers, width, channelCount_);
         }
+    }
+
+    /// Adds the numbers of `row`, times `weight`. `numbers` is room for a row.
+    void addNumbers(const T* row, float weight, float* sums, float* numbers, u32 width) const {
+        const u64 count = u64(width) * channelCount_;
+        if (!transform_) {
+            for (u64 k = 0; k < count; ++k)
+                sums[k] += weight * toNumber(row[k]);
+            return;
+        }
+        toNumbers(row, numbers, width);
+        for (u64 k = 0; k < count; ++k)
+            sums[k] += weight * numbers[k];
     }
 
     /// Changes `sums`.
@@ -134,10 +147,12 @@ private:
     void applyTable(const T* row, float* numbers, u64 count) const {
         if constexpr (std::is_unsigned_v<T>) {
             const vector<float>& table = transform_->table;
-            for (u64 k = 0; k < count; ++k) {
-                const bool isAlpha = static_cast<i32>(k % channelCount_) == alphaIndex_;
-                if (!isAlpha && row[k] < table.size())
-                    numbers[k] = table.data()[row[k]];
+            for (u64 pixel = 0; pixel < count; pixel += channelCount_) {
+                for (u32 c = 0; c < channelCount_; ++c) {
+                    const T component = row[pixel + c];
+                    if (static_cast<i32>(c) != alphaIndex_ && component < table.size())
+                        numbers[pixel + c] = table.data()[component];
+                }
             }
         }
     }
@@ -163,7 +178,7 @@ void sumColumns(const ResizeKernel& kernel, const Lanes* columns, Lanes* sums) {
     }
 }
 
-/// The rows of one slice resampled in width, as numbers, made when they are first asked for.
+/// The rows of one slice resampled in width, made when they are first asked for.
 template <class T>
 class ResampledRows {
 public:
@@ -178,27 +193,25 @@ public:
         sourceStride_ = roundedUp(reach * channelCount_);
         targetStride_ = roundedUp(u64(targetWidth_) * channelCount_);
         numbers_.resize(sourceStride_ * rowsAtOnce);
-        plainRow_.resizeUninitialized(u64(source.width()) * channelCount_);
         interleaved_.resize(sourceStride_);
         sums_.resize(targetStride_);
         separated_.resize(targetStride_ * rowsAtOnce);
-        components_.resize(u64(targetWidth_) * channelCount_);
         kept_.resize(rows.greatestCount() + rowsAtOnce);
         for (Kept& kept : kept_)
-            kept.numbers.resizeUninitialized(u64(targetWidth_) * channelCount_);
+            kept.components.resizeUninitialized(u64(targetWidth_) * channelCount_);
     }
 
-    /// The numbers of the row that stands at `position`.
-    const float* at(i64 position) {
+    /// The row that stands at `position`.
+    const T* at(i64 position) {
         if (place(position).position != position)
             resample(position);
-        return place(position).numbers.data();
+        return place(position).components.data();
     }
 
 private:
     struct Kept {
         i64 position = noPosition;
-        vector<float> numbers;
+        vector<T> components;
     };
     static constexpr i64 noPosition = std::numeric_limits<i64>::min();
 
@@ -227,9 +240,8 @@ private:
         separate(sums_.data(), targetStride_, separated_.data());
         for (u32 lane = 0; lane < rowsAtOnce && position + lane <= lastPosition_; ++lane) {
             Kept& kept = place(position + lane);
-            codec_.fromSums(separated_.data() + targetStride_ * lane, components_.data(),
+            codec_.fromSums(separated_.data() + targetStride_ * lane, kept.components.data(),
                             targetWidth_);
-            codec_.toNumbers(components_.data(), kept.numbers.data(), targetWidth_);
             kept.position = position + lane;
         }
     }
@@ -241,17 +253,26 @@ private:
         float* target = numbers_.data() + sourceStride_ * lane;
         const i64 first = columns_.first(), last = columns_.last();
         const u32 width = source_.width();
-        if (first == 0 && last == i64(width) - 1)
-            return codec_.toNumbers(components, target, width);
-        codec_.toNumbers(components, plainRow_.data(), width);
-        for (i64 x = first; x <= last; ++x, target += channelCount_) {
-            const float* pixel = plainRow_.data() + u64(resolved(x, width, wraps_)) * channelCount_;
-            std::copy(pixel, pixel + channelCount_, target);
-        }
+        // The source's own places are a range within those that the taps reach, or the other way
+        // round.
+        const i64 firstInside = std::max<i64>(first, 0);
+        const i64 lastInside = std::min<i64>(last, i64(width) - 1);
+        if (firstInside <= lastInside)
+            codec_.toNumbers(components + firstInside * channelCount_,
+                             target + (firstInside - first) * channelCount_,
+                             static_cast<u32>(lastInside - firstInside + 1));
+        const auto fill = [&](i64 x) {
+            const T* pixel = components + u64(resolved(x, width, wraps_)) * channelCount_;
+            codec_.toNumbers(pixel, target + (x - first) * channelCount_, 1);
+        };
+        for (i64 x = first; x < std::min<i64>(last + 1, 0); ++x)
+            fill(x);
+        for (i64 x = std::max<i64>(first, width); x <= last; ++x)
+            fill(x);
     }
 
     const Image& source_;
-    RowCodec<T> codec_;
+    RowNumbers<T> codec_;
     const ResizeKernel& columns_;
     u64 firstRow_;
     u32 rowCount_;
@@ -260,12 +281,10 @@ private:
     u32 channelCount_;
     u32 targetWidth_;
     u64 sourceStride_, targetStride_;
-    vector<float> numbers_;  ///< of `rowsAtOnce` rows of what the taps reach
-    vector<float> plainRow_; ///< of the source's row, where the taps reach something else
+    vector<float> numbers_; ///< of `rowsAtOnce` rows of what the taps reach
     vector<Lanes> interleaved_;
     vector<Lanes> sums_;
     vector<float> separated_;
-    vector<T> components_;
     vector<Kept> kept_;
 };
 
@@ -274,20 +293,16 @@ template <class T>
 void resizeRows(const Image& source, u64 sourceRow, u32 sourceHeight, Image& target, u64 targetRow,
                 const ResizeKernel& columns, const ResizeKernel& rows, bool wraps) {
     ResampledRows<T> resampled(source, sourceRow, sourceHeight, columns, rows, wraps);
-    const RowCodec<T> codec(source);
+    const RowNumbers<T> codec(source);
     const u64 count = u64(columns.targetSize()) * source.channelCount();
-    vector<float> sums(count);
+    vector<float> sums(count), numbers(count);
     for (u32 y = 0; y < rows.targetSize(); ++y) {
         const ResizeKernel::Taps& taps = rows.taps(y);
         const float* weights = rows.weights(taps);
         std::fill(sums.begin(), sums.end(), 0.0f);
-        for (u32 t = 0; t < taps.count; ++t) {
-            const float* numbers = resampled.at(taps.first + t);
-            const float weight = weights[t];
-            float* sum = sums.data();
-            for (u64 k = 0; k < count; ++k)
-                sum[k] += weight * numbers[k];
-        }
+        for (u32 t = 0; t < taps.count; ++t)
+            codec.addNumbers(resampled.at(taps.first + t), weights[t], sums.data(), numbers.data(),
+                             columns.targetSize());
         codec.fromSums(sums.data(), reinterpret_cast<T*>(target.row(targetRow + y)),
                        columns.targetSize());
     }

@@ -20,7 +20,7 @@ struct Range {
 Range touched(float centre, float halfWidth, u32 sourceSize, bool cutsAtEdges) {
     Range range{base::saturate<i32>(std::floor(centre - halfWidth)),
                 base::saturate<i32>(std::ceil(centre + halfWidth))};
-    const auto window = base::saturate<i64>(std::ceil(2 * halfWidth)) + 1;
+    const i64 window = i64(base::saturate<i32>(std::ceil(2 * halfWidth))) + 1;
     if (range.last - range.first >= window) {
         if (halfWidth - 1 > static_cast<float>(range.first))
             ++range.first;

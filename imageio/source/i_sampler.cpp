@@ -7,6 +7,7 @@
 #include "b_exception.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 
 namespace iio {
@@ -16,6 +17,25 @@ namespace {
 using Colour = float[4];
 
 constexpr u32 mostTapsAlongAxis = 32;
+
+constexpr auto byteUnits = [] {
+    std::array<float, 256> units{};
+    for (u32 i = 0; i < 256; ++i)
+        units[i] = static_cast<float>(i) / 255.0f;
+    return units;
+}();
+
+/// The number of a component. Unsigned ones are divided by their maximum, which a product with its
+/// reciprocal, as conversions of pictures have it, does not equal in the last place.
+template <class C>
+float toUnit(C component) {
+    if constexpr (std::is_same_v<C, u8>)
+        return byteUnits[component];
+    else if constexpr (std::is_same_v<C, u16>)
+        return static_cast<float>(component) / 65535.0f;
+    else
+        return toNumber(component);
+}
 
 /// The coordinate inside 0..extent - 1 that stands for `i`; -1 for the border.
 i64 wrapped(i64 i, i64 extent, u32 mode) {
@@ -129,14 +149,20 @@ private:
         const float y = uv.y * floatHeight_ - 0.5f;
         const float left = std::floor(x), top = std::floor(y);
         const i64 x0 = base::saturate<i32>(left), y0 = base::saturate<i32>(top);
-        Colour a = {}, b = {}, upper, lower;
-        read(a, x0, y0, face);
-        read(b, x0 + 1, y0, face);
-        mix(a, b, x - left, upper);
-        read(a, x0, y0 + 1, face);
-        read(b, x0 + 1, y0 + 1, face);
-        mix(a, b, x - left, lower);
-        mix(upper, lower, y - top, out);
+        Colour texels[4] = {};
+        const bool areInside = x0 >= 0 && x0 + 1 < width_ && y0 >= 0 && y0 + 1 < height_;
+        for (int i = 0; i < 4; ++i) {
+            if (areInside)
+                fetch(x0 + i % 2, y0 + i / 2 + height_ * face, texels[i]);
+            else
+                read(texels[i], x0 + i % 2, y0 + i / 2, face);
+        }
+        const float fractionX = std::isfinite(x) ? x - left : 0;
+        const float fractionY = std::isfinite(y) ? y - top : 0;
+        Colour upper, lower;
+        mix(texels[0], texels[1], fractionX, upper);
+        mix(texels[2], texels[3], fractionX, lower);
+        mix(upper, lower, fractionY, out);
     }
 
     SamplerOptions options_;
@@ -184,50 +210,68 @@ class GreySampler final : public BaseSampler<GreySampler<C>> {
 public:
     using BaseSampler<GreySampler>::BaseSampler;
     void fetch(i64 x, i64 y, Colour& out) const {
-        const float grey = toNumber(reinterpret_cast<const C*>(this->row(y))[x]);
+        const float grey = toUnit(reinterpret_cast<const C*>(this->row(y))[x]);
         std::fill(std::begin(out), std::end(out), grey);
     }
 };
 
-/// Two channels: red and green or, with `swap`, grey and alpha.
+/// Of two components: red and green or, with `swap`, grey and alpha.
+template <bool swap>
+void setPair(float first, float second, Colour& out) {
+    out[0] = first;
+    out[1] = swap ? first : second;
+    out[2] = swap ? first : 0.0f;
+    out[3] = swap ? second : 1.0f;
+}
+
 template <class C, bool swap>
 class RGSampler final : public BaseSampler<RGSampler<C, swap>> {
 public:
     using BaseSampler<RGSampler>::BaseSampler;
     void fetch(i64 x, i64 y, Colour& out) const {
         const C* pixel = reinterpret_cast<const C*>(this->row(y)) + 2 * x;
-        const float first = toNumber(pixel[0]), second = toNumber(pixel[1]);
-        out[0] = first;
-        out[1] = swap ? first : second;
-        out[2] = swap ? first : 0.0f;
-        out[3] = swap ? second : 1.0f;
+        setPair<swap>(toUnit(pixel[0]), toUnit(pixel[1]), out);
     }
 };
 
 /// Three or four channels; with `swap`, blue comes first.
-template <class C, bool swap>
-class RGBSampler final : public BaseSampler<RGBSampler<C, swap>> {
+template <class C, int channelCount, bool swap>
+class RGBSampler final : public BaseSampler<RGBSampler<C, channelCount, swap>> {
 public:
-    RGBSampler(const Image& image, const SamplerOptions& options)
-        : BaseSampler<RGBSampler>(image, options), channelCount_(image.channelCount()) {}
+    using BaseSampler<RGBSampler>::BaseSampler;
     void fetch(i64 x, i64 y, Colour& out) const {
-        const C* pixel = reinterpret_cast<const C*>(this->row(y)) + channelCount_ * x;
-        out[0] = toNumber(pixel[swap ? 2 : 0]);
-        out[1] = toNumber(pixel[1]);
-        out[2] = toNumber(pixel[swap ? 0 : 2]);
-        out[3] = channelCount_ == 4 ? toNumber(pixel[3]) : 1.0f;
+        const C* pixel = reinterpret_cast<const C*>(this->row(y)) + channelCount * x;
+        out[0] = toUnit(pixel[swap ? 2 : 0]);
+        out[1] = toUnit(pixel[1]);
+        out[2] = toUnit(pixel[swap ? 0 : 2]);
+        out[3] = channelCount == 4 ? toUnit(pixel[3]) : 1.0f;
     }
-
-private:
-    i64 channelCount_;
 };
 
-/// Decodes the block that holds the texel and hands its components to `Derived::spread`.
-template <class Derived>
-class BlockSampler : public BaseSampler<Derived> {
+/// Turns the components of a block's pixel into a colour.
+using Spread = void (*)(const u8 (&pixel)[4], Colour& out);
+
+template <bool hasAlpha>
+void spreadColour(const u8 (&pixel)[4], Colour& out) {
+    for (int c = 0; c < 4; ++c)
+        out[c] = c < 3 || hasAlpha ? toUnit(pixel[c]) : 1.0f;
+}
+
+void spreadGrey(const u8 (&pixel)[4], Colour& out) {
+    std::fill(std::begin(out), std::end(out), toUnit(pixel[0]));
+}
+
+template <bool swap>
+void spreadPair(const u8 (&pixel)[4], Colour& out) {
+    setPair<swap>(toUnit(pixel[0]), toUnit(pixel[1]), out);
+}
+
+/// Decodes the block that holds the texel.
+template <Spread spread>
+class BlockSampler final : public BaseSampler<BlockSampler<spread>> {
 public:
     BlockSampler(const Image& image, const SamplerOptions& options)
-        : BaseSampler<Derived>(image, options), grid_(image),
+        : BaseSampler<BlockSampler>(image, options), grid_(image),
           decode_(findBlockFormat(image.format())->decode) {}
     void fetch(i64 x, i64 y, Colour& out) const {
         const auto layer = static_cast<u32>(y / this->height());
@@ -235,7 +279,7 @@ public:
         const u64 offset = grid_.offset(layer, static_cast<u32>(x / 4), static_cast<u32>(y / 4));
         BlockPixels pixels;
         decode_(this->pixels() + offset, pixels);
-        Derived::spread(pixels.components[y % 4 * 4 + x % 4], out);
+        spread(pixels.components[y % 4 * 4 + x % 4], out);
     }
 
 private:
@@ -243,57 +287,13 @@ private:
     void (*decode_)(const u8*, BlockPixels&);
 };
 
-template <bool hasAlpha>
-void spreadColour(const u8 (&pixel)[4], Colour& out) {
-    for (int c = 0; c < 4; ++c)
-        out[c] = c < 3 || hasAlpha ? toNumber(pixel[c]) : 1.0f;
-}
-
-class DXT1Sampler final : public BlockSampler<DXT1Sampler> {
-public:
-    using BlockSampler::BlockSampler;
-    static constexpr auto spread = spreadColour<false>;
-};
-
-class DXT1ASampler final : public BlockSampler<DXT1ASampler> {
-public:
-    using BlockSampler::BlockSampler;
-    static constexpr auto spread = spreadColour<true>;
-};
-
-class DXT3Sampler final : public BlockSampler<DXT3Sampler> {
-public:
-    using BlockSampler::BlockSampler;
-    static constexpr auto spread = spreadColour<true>;
-};
-
-class DXT5Sampler final : public BlockSampler<DXT5Sampler> {
-public:
-    using BlockSampler::BlockSampler;
-    static constexpr auto spread = spreadColour<true>;
-};
-
-class BC4Sampler final : public BlockSampler<BC4Sampler> {
-public:
-    using BlockSampler::BlockSampler;
-    static void spread(const u8 (&pixel)[4], Colour& out) {
-        std::fill(std::begin(out), std::end(out), toNumber(pixel[0]));
-    }
-};
-
-/// Two channels: red and green or, with `swap`, grey and alpha.
+using DXT1Sampler = BlockSampler<spreadColour<false>>;
+using DXT1ASampler = BlockSampler<spreadColour<true>>;
+using DXT3Sampler = BlockSampler<spreadColour<true>>;
+using DXT5Sampler = BlockSampler<spreadColour<true>>;
+using BC4Sampler = BlockSampler<spreadGrey>;
 template <bool swap>
-class BC5Sampler final : public BlockSampler<BC5Sampler<swap>> {
-public:
-    using BlockSampler<BC5Sampler>::BlockSampler;
-    static void spread(const u8 (&pixel)[4], Colour& out) {
-        const float first = toNumber(pixel[0]), second = toNumber(pixel[1]);
-        out[0] = first;
-        out[1] = swap ? first : second;
-        out[2] = swap ? first : 0.0f;
-        out[3] = swap ? second : 1.0f;
-    }
-};
+using BC5Sampler = BlockSampler<spreadPair<swap>>;
 
 using Made = std::unique_ptr<Sampler>;
 
@@ -306,11 +306,13 @@ template <class C>
 Made makePlain(const Image& image, const SamplerOptions& options) {
     switch (image.format()) {
     case Image::kRGB:
+        return std::make_unique<RGBSampler<C, 3, false>>(image, options);
     case Image::kRGBA:
-        return std::make_unique<RGBSampler<C, false>>(image, options);
+        return std::make_unique<RGBSampler<C, 4, false>>(image, options);
     case Image::kBGR:
+        return std::make_unique<RGBSampler<C, 3, true>>(image, options);
     case Image::kBGRA:
-        return std::make_unique<RGBSampler<C, true>>(image, options);
+        return std::make_unique<RGBSampler<C, 4, true>>(image, options);
     case Image::kRG:
         return std::make_unique<RGSampler<C, false>>(image, options);
     case Image::kLuminanceAlpha:

@@ -16,18 +16,18 @@ struct TgaHeader {
 
     enum class Kind { indexed = 1, colour = 2, grey = 3 };
 
-    Kind kind;
-    bool isPacked;
-    bool startsAtTop;
-    bool startsAtRight;
-    u32 width, height;
-    u32 alphaBits;    ///< "attribute bits"; 0 also where the writer forgot them
-    u32 pixelBits;    ///< of a pixel in the file, whole bytes
-    u32 colourBits;   ///< of a palette entry of an indexed picture, else of a pixel
-    u32 idBytes;      ///< text between header and palette
-    u32 paletteFirst; ///< index that the first palette entry has
-    u32 paletteCount; ///< entries in the file, which true colour pictures may have too
-    u32 paletteEntryBytes;
+    Kind kind = Kind::colour;
+    bool isPacked = false;
+    bool startsAtTop = false;
+    bool startsAtRight = false;
+    u32 width = 0, height = 0;
+    u32 alphaBits = 0;    ///< "attribute bits"; 0 also where the writer forgot them
+    u32 pixelBits = 0;    ///< of a pixel in the file, whole bytes
+    u32 colourBits = 0;   ///< of a palette entry of an indexed picture, else of a pixel
+    u32 idBytes = 0;      ///< text between header and palette
+    u32 paletteFirst = 0; ///< index that the first palette entry has
+    u32 paletteCount = 0; ///< entries in the file, which true colour pictures may have too
+    u32 paletteEntryBytes = 0;
 
     u64 pixelCount() const noexcept { return u64(width) * height; }
     u32 pixelBytes() const noexcept { return pixelBits / 8; }
@@ -36,11 +36,6 @@ struct TgaHeader {
     /// and 16-bit grey have alpha whatever the header counts, as many writers forget the count.
     u8 format() const noexcept;
 };
-
-/// A number of two bytes, the low one first.
-inline u32 tgaWord(const u8* bytes) {
-    return u32(bytes[0] | bytes[1] << 8);
-}
 
 /// From the position to the end.
 inline u64 tgaBytesLeft(const base::Stream& stream) {

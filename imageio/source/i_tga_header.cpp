@@ -1,5 +1,6 @@
 #include "i_tga.h"
 
+#include "b_byte_order.h"
 #include "b_log.h"
 
 namespace iio {
@@ -68,14 +69,14 @@ const char* parseTgaHeader(const u8 (&bytes)[TgaHeader::byteSize], TgaHeader& he
     header.isPacked = (bytes[2] & packedBit) != 0;
     header.startsAtTop = (descriptor & startsAtTopBit) != 0;
     header.startsAtRight = (descriptor & startsAtRightBit) != 0;
-    header.width = tgaWord(bytes + 12);
-    header.height = tgaWord(bytes + 14);
+    header.width = base::readLittleEndian<u16>(bytes + 12);
+    header.height = base::readLittleEndian<u16>(bytes + 14);
     header.alphaBits = descriptor & alphaBitsMask;
     header.pixelBits = bytesOf(depth) * 8;
     header.colourBits = header.kind == TgaHeader::Kind::indexed ? entryBits : depth;
     header.idBytes = bytes[0];
-    header.paletteFirst = mapType == 1 ? tgaWord(bytes + 3) : 0;
-    header.paletteCount = mapType == 1 ? tgaWord(bytes + 5) : 0;
+    header.paletteFirst = mapType == 1 ? base::readLittleEndian<u16>(bytes + 3) : 0;
+    header.paletteCount = mapType == 1 ? base::readLittleEndian<u16>(bytes + 5) : 0;
     header.paletteEntryBytes = bytesOf(entryBits);
 
     if (const char* fault = paletteFault(header, mapType, entryBits))

@@ -1,5 +1,6 @@
 #include "i_tga.h"
 
+#include "b_byte_order.h"
 #include "b_log.h"
 #include "stream/b_stream_workers.h"
 
@@ -20,7 +21,7 @@ constexpr u8 widen(u32 fiveBits) {
 /// Blue, green, red and, for 4 channels, alpha of `count` colours of 16 bits.
 void expandWords(const u8* source, u8* target, u32 count, u32 channels) {
     for (; count > 0; --count, source += 2, target += channels) {
-        const u32 value = tgaWord(source);
+        const u32 value = base::readLittleEndian<u16>(source);
         target[0] = widen(value & 31);
         target[1] = widen(value >> 5 & 31);
         target[2] = widen(value >> 10 & 31);

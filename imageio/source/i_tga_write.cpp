@@ -1,6 +1,8 @@
 #include "i_tga.h"
 
 #include "i_codec.h"
+#include "i_fitting.h"
+#include "i_operation.h"
 
 #include "b_log.h"
 
@@ -26,31 +28,16 @@ u8 fileFormat(u8 format) {
     return info.hasAlpha ? ImageTypes::kBGRA : ImageTypes::kBGR;
 }
 
-/// `image`, or what it was converted to, in bytes of a format that the file can hold; null, with a
-/// message, if that can't be made. `converted` owns what is not `image` itself, which may lie
-/// anywhere and is never counted here.
-const Image* makeFitting(const base::Stream& stream, Image& image, ref<Image>& converted) {
-    Image* fitting = &image;
-    const u8 format = fileFormat(image.format());
+/// To bytes of a format that the file can hold.
+bool convert(Fitting& fitting) {
     // Blocks first: they have no component type to convert.
-    if (fitting->format() != format) {
-        converted = fitting->convertFormat(format);
-        fitting = converted.get();
-        if (!fitting) {
-            logFault(stream, "could not convert the image to a supported format");
-            return nullptr;
-        }
-    }
-    if (fitting->type() != ImageTypes::IT_UNSIGNED_BYTE) {
-        converted = fitting->convertType(ImageTypes::IT_UNSIGNED_BYTE);
-        fitting = converted.get();
-        if (!fitting)
-            logFault(stream, "could not convert the image to unsigned bytes");
-    }
-    return fitting;
+    return fitting.toFormat(fileFormat(fitting->format()),
+                            "tga save |{}| could not convert the image to a supported format") &&
+           fitting.toType(ImageTypes::IT_UNSIGNED_BYTE,
+                          "tga save |{}| could not convert the image to unsigned bytes");
 }
 
-bool writeHeader(BlockWriter& writer, const Image& image, bool packs) {
+bool writeHeader(StreamWriter& writer, const Image& image, bool packs) {
     const u32 bits = image.channelCount() * 8;
     const u32 kind = bits == 8 ? 3 : 2; // grey or colour
     u8 header[TgaHeader::byteSize] = {};
@@ -109,7 +96,7 @@ void packRow(const u8* row, const Image& image, vector<u8>& out) {
 }
 
 /// From the bottom.
-bool writeRows(BlockWriter& writer, const Image& image, bool packs) {
+bool writeRows(StreamWriter& writer, const Image& image, bool packs) {
     const u64 rowBytes = u64(image.width()) * image.channelCount();
     vector<u8> packets;
     for (u32 y = image.height(); y-- > 0;) {
@@ -127,7 +114,7 @@ bool writeRows(BlockWriter& writer, const Image& image, bool packs) {
     return true;
 }
 
-bool writeFooter(BlockWriter& writer) {
+bool writeFooter(StreamWriter& writer) {
     // No extension area and no developer area.
     constexpr char footer[] = "\0\0\0\0\0\0\0\0TRUEVISION-XFILE.";
     return writer.append(reinterpret_cast<const u8*>(footer), sizeof footer);
@@ -146,17 +133,10 @@ bool checkTgaSize(const base::Stream& stream, u32 width, u32 height, u32 depth, 
 }
 
 bool writeTga(base::Stream& stream, Image& image, bool packs) {
-    if (!image.data()) {
-        logFault(stream, "the image has no pixels");
+    Fitting fitting(image, stream);
+    if (!requirePixels(image, base::format("tga save |{}|", fitting.name())) || !convert(fitting))
         return false;
-    }
-    if (!checkTgaSize(stream, image.width(), image.height(), image.depth(), image.isCube()))
-        return false;
-    ref<Image> converted;
-    const Image* fitting = makeFitting(stream, image, converted);
-    if (!fitting)
-        return false;
-    BlockWriter writer(stream);
+    StreamWriter writer(stream);
     const bool isWhole = writeHeader(writer, *fitting, packs) &&
                          writeRows(writer, *fitting, packs) && writeFooter(writer) &&
                          writer.flush();

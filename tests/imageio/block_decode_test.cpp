@@ -1,8 +1,8 @@
 #include "i_block_decode.h"
+#include "picture_builder.h"
 
 #include <array>
 #include <cstring>
-#include <gtest/gtest.h>
 
 namespace iio {
 namespace {
@@ -13,7 +13,9 @@ using Block = std::initializer_list<u8>;
 /// Numbers 0, 1, 2... as indices of three bits, 8 in 3 bytes.
 #define COUNT_OF_EIGHT 0x88, 0xC6, 0xFA
 
-void expectPixels(u8 format, Block block, const char* what, std::initializer_list<Pixel> expected) {
+/// `expected` are the pixels in their order, each `repeat` times, then again from the first.
+void expectPixels(u8 format, Block block, const char* what, std::initializer_list<Pixel> expected,
+                  size_t repeat = 1) {
     const BlockFormat* blockFormat = findBlockFormat(format);
     ASSERT_TRUE(blockFormat);
     ASSERT_EQ(block.size(), blockFormat->byteSize) << what;
@@ -23,7 +25,7 @@ void expectPixels(u8 format, Block block, const char* what, std::initializer_lis
     for (size_t i = 0; i < 16; ++i) {
         const u8* actual = pixels.components[i];
         EXPECT_EQ((Pixel{actual[0], actual[1], actual[2], actual[3]}),
-                  expected.begin()[i % expected.size()])
+                  expected.begin()[i / repeat % expected.size()])
             << what << ", pixel " << i;
     }
 }
@@ -40,22 +42,7 @@ TEST(BlockDecode, FollowsPublishedFormats) {
     // 16 of 31, 32 of 63 and 1 of 31 are 131.6, 129.5 and 8.2; equal colours are of the second
     // kind.
     expectPixels(Types::kDXT1A, {0x01, 0x84, 0x01, 0x84, 0x00, 0x55, 0xAA, 0xFF}, "rows",
-                 {{132, 130, 8, 255},
-                  {132, 130, 8, 255},
-                  {132, 130, 8, 255},
-                  {132, 130, 8, 255},
-                  {132, 130, 8, 255},
-                  {132, 130, 8, 255},
-                  {132, 130, 8, 255},
-                  {132, 130, 8, 255},
-                  {132, 130, 8, 255},
-                  {132, 130, 8, 255},
-                  {132, 130, 8, 255},
-                  {132, 130, 8, 255},
-                  {0, 0, 0, 0},
-                  {0, 0, 0, 0},
-                  {0, 0, 0, 0},
-                  {0, 0, 0, 0}});
+                 {{132, 130, 8, 255}, {132, 130, 8, 255}, {132, 130, 8, 255}, {0, 0, 0, 0}}, 4);
     // Alpha in sixteenths, and colours that BC1 would take for the kind with black.
     expectPixels(Types::kDXT3,
                  {0x10, 0xF8, 0x10, 0xF8, 0x10, 0xF8, 0x10, 0xF8, //
@@ -103,27 +90,21 @@ ref<Image> numberedBlocks(const ref<Image>& image) {
 
 TEST(BlockDecode, PlacesBlocksOfPictures) {
     using Types = ImageTypes;
-    struct Row {
-        u8 format, plainFormat;
-        u32 component; ///< that bears the number
-    };
-    const Row rows[] = {
-        {Types::kDXT1, Types::kRGB, 2},        {Types::kDXT1A, Types::kRGBA, 2},
-        {Types::kDXT3, Types::kRGBA, 2},       {Types::kDXT5, Types::kRGBA, 2},
-        {Types::kLATC1, Types::kLuminance, 0}, {Types::kLATC2, Types::kLuminanceAlpha, 1},
-        {Types::kRGTC1, Types::kRed, 0},       {Types::kRGTC2, Types::kRG, 1},
-    };
-    for (const Row& row : rows) {
-        const bool isColor = row.format < Types::kLATC1;
+    const u8 plainFormats[] = {Types::kRGB,  Types::kRGBA,      Types::kRGBA,
+                               Types::kRGBA, Types::kLuminance, Types::kLuminanceAlpha,
+                               Types::kRed,  Types::kRG};
+    for (u8 format = Types::kDXT1; format <= Types::kRGTC2; ++format) {
+        const bool isColor = format < Types::kLATC1;
         // 3 x 2 blocks a layer, the last ones cut, without and with gaps between layers.
         for (const bool isCube : {false, true}) {
             const ref<Image> image = base::makeRef<Image>();
             if (isCube)
-                image->createCube(9, 5, 1, row.format, 0);
+                image->createCube(9, 5, 1, format, 0);
             else
-                image->create(9, 5, 2, 1, row.format, 0);
+                image->create(9, 5, 2, 1, format, 0);
             image->setPath("blocks");
-            const ref<Image> plain = numberedBlocks(image)->convertFormat(row.plainFormat);
+            const ref<Image> plain =
+                numberedBlocks(image)->convertFormat(plainFormats[format - Types::kDXT1]);
             ASSERT_TRUE(plain);
             EXPECT_EQ(plain->type(), Types::IT_UNSIGNED_BYTE);
             EXPECT_EQ(plain->path(), "blocks");
@@ -132,25 +113,23 @@ TEST(BlockDecode, PlacesBlocksOfPictures) {
             for (u32 i = 0; i < 9 * plain->rowCount(); ++i) {
                 const u32 x = i % 9, y = i / 9 % 5, layer = i / 45;
                 const u32 number = (layer * 6 + y / 4 * 3 + x / 4) % (isColor ? 32 : 256);
-                const u8 value = plain->row(i / 9)[x * channels + row.component];
+                const u8 value = plain->row(i / 9)[x * channels + (isColor ? 2 : channels - 1)];
                 ASSERT_EQ(isColor ? value >> 3 : value, static_cast<int>(number))
-                    << formatInfo(row.format).name << " at " << x << ", " << i / 9;
+                    << formatInfo(format).name << " at " << x << ", " << i / 9;
             }
         }
     }
 }
 
 TEST(BlockDecode, GoesOnToOtherFormats) {
-    using Types = ImageTypes;
-    const ref<Image> image = base::makeRef<Image>(3, 1, 1, 8, Types::kLATC2, Types::IT_IMPLICIT);
-    std::memset(image->data(), 0, image->memorySize());
-    image->data()[0] = 200;
-    image->data()[8] = 90;
-    const ref<Image> colors = image->convertFormat(Types::kBGRA);
+    const auto image = imageOf(4, 4, Image::kLATC2, 0, //
+                               {200, 0, 0, 0, 0, 0, 0, 0, 90, 0, 0, 0, 0, 0, 0, 0});
+    const ref<Image> colors = image->convertFormat(Image::kBGRA);
     ASSERT_TRUE(colors);
-    const u8 pixel[] = {200, 200, 200, 90};
-    for (u32 x = 0; x < 3; ++x)
-        EXPECT_EQ(std::memcmp(colors->data() + x * 4, pixel, 4), 0);
+    const vector<double> components = componentsOf(*colors);
+    for (size_t i = 0; i < 64; i += 4)
+        EXPECT_EQ(vector<double>(&components[i], &components[i] + 4),
+                  (vector<double>{200, 200, 200, 90}));
 }
 
 } // namespace

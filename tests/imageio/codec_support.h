@@ -1,12 +1,14 @@
 #pragma once
 
+#include "i_file.h"
 #include "i_plugin.h"
 #include "log_capture.h"
+#include "picture_builder.h"
 
 #include "stream/b_stream_workers.h"
 
+#include <cstdio>
 #include <filesystem>
-#include <gtest/gtest.h>
 #include <unistd.h>
 
 /// What the tests of the formats share.
@@ -22,6 +24,16 @@ inline ref<Image> loadBytes(const Bytes& bytes, const char* name) {
     return loadImage(stream);
 }
 
+/// A small file of the fuzzers, by format and name.
+inline Bytes readSeed(const string& name) {
+    const string path = string(IMAGE_SEEDS "/") + name;
+    std::unique_ptr<std::FILE, int (*)(std::FILE*)> file(std::fopen(path.c_str(), "rb"),
+                                                         std::fclose);
+    Bytes bytes(std::filesystem::file_size(path.c_str()), 0);
+    EXPECT_EQ(std::fread(bytes.data(), 1, bytes.size(), file.get()), bytes.size());
+    return bytes;
+}
+
 inline bool readInfoOf(const Bytes& bytes, const char* name, ImageInfo& info) {
     base::Stream stream = base::memStreamView(bytes.data(), bytes.size(), name);
     return readImageInfo(stream, info);
@@ -35,13 +47,7 @@ inline Bytes saveBytes(Image& image, const char* name,
     return saveImage(image, stream, attributes) ? bytes : Bytes();
 }
 
-inline ref<Image> makeImage(u32 width, u32 height, u8 format, u8 type = Image::IT_UNSIGNED_BYTE) {
-    auto image = base::makeRef<Image>();
-    image->create(width, height, 1, 1, format, type);
-    return image;
-}
-
-/// The same with the bytes 1, 2, 3...
+/// A picture of the bytes 1, 2, 3...
 inline ref<Image> makeCounting(u32 width, u32 height, u8 format,
                                u8 type = Image::IT_UNSIGNED_BYTE) {
     ref<Image> image = makeImage(width, height, format, type);
@@ -50,32 +56,10 @@ inline ref<Image> makeCounting(u32 width, u32 height, u8 format,
     return image;
 }
 
-inline Bytes pixelsOf(const Image& image) {
-    return Bytes(image.data(), image.data() + image.memorySize());
-}
-
 template <class T>
 T valueOf(const base::AttribMap& attributes, base::name_id name) {
     const T* value = attributes.findAttribute<T>(name);
     return value ? *value : T();
-}
-
-/// Changes each byte in turn, from `first` on: all that may follow is a picture, or null and a
-/// message. Returns how often it was null.
-inline u32 countLost(const Bytes& whole, const char* name, u64 first) {
-    u32 lostCount = 0;
-    for (u64 at = first; at < whole.size(); ++at) {
-        for (const u8 flip : Bytes{0x01, 0x80, 0xFF}) {
-            Bytes damaged = whole;
-            damaged[at] = static_cast<u8>(damaged[at] ^ flip);
-            test_support::LogCapture log;
-            const bool isLost = !loadBytes(damaged, name);
-            lostCount += isLost ? 1 : 0;
-            EXPECT_EQ(log.has(base::logError, base::format("Unable to load {}", name)), isLost)
-                << at;
-        }
-    }
-    return lostCount;
 }
 
 /// A folder of its own, gone with the object.
@@ -94,15 +78,5 @@ public:
 private:
     string path_;
 };
-
-/// Saving to a device that is full fails with `message`, in which {} is the path.
-inline void expectFullDiskTold(const char* name, const char* message) {
-    const TempFolder folder;
-    const string path = folder.file(name);
-    std::filesystem::create_symlink("/dev/full", path.c_str());
-    test_support::LogCapture log;
-    EXPECT_FALSE(saveImage(*makeCounting(300, 300, Image::kRGB), path));
-    EXPECT_EQ(linesOf(log), base::format("2 {}\n", base::format(message, path)));
-}
 
 } // namespace iio

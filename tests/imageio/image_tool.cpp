@@ -1,4 +1,4 @@
-#include "i_plugin.h"
+#include "i_file.h"
 
 #include "b_log.h"
 
