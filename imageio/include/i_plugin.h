@@ -103,5 +103,3 @@ public:
 };
 
 } // namespace iio
-
-#include "i_file.h"

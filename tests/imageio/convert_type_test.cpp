@@ -1,5 +1,6 @@
 #include "picture_builder.h"
 
+#include <algorithm>
 #include <cmath>
 #include <limits>
 

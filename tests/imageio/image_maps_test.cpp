@@ -6,6 +6,7 @@
 
 #include "stream/b_fs.h"
 
+#include <algorithm>
 #include <array>
 
 namespace iio {

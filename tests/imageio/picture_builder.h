@@ -3,6 +3,7 @@
 #include "i_component.h"
 #include "i_image.h"
 
+#include <algorithm>
 #include <gtest/gtest.h>
 
 /// Small pictures for tests.

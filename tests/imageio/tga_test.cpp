@@ -1,6 +1,7 @@
 #include "codec_support.h"
 
 #include <charconv>
+#include <cstring>
 #include <random>
 
 namespace iio {

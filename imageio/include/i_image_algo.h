@@ -1,3 +1,0 @@
-#pragma once
-#include "i_cubemap.h"
-#include "i_normal_map.h"
