@@ -2,10 +2,10 @@
 
 #include "GLTF/element_range.h"
 #include "GLTF/json_writer.h"
-#include "GLTF/prefault.h"
 
 #include "b_exception.h"
 #include "b_format.h"
+#include "b_pages.h"
 
 #include <iterator>
 
@@ -161,7 +161,7 @@ ref<Buffer> Buffer::zeroed(i32 length) {
     buffer->data = static_cast<u8*>(
         base::AllocPolicy::allocateZeroed(static_cast<std::size_t>(std::max(length, 0))));
     buffer->byteLength = std::max(length, 0);
-    prefault(buffer->data, static_cast<std::size_t>(buffer->byteLength));
+    base::prefault(buffer->data, static_cast<std::size_t>(buffer->byteLength));
     return buffer;
 }
 
@@ -180,7 +180,7 @@ void Buffer::writeJSON(JsonWriter& writer, const Options& options) {
                                                      static_cast<std::size_t>(byteLength));
         uri.clear();
         uri.reserve(text.size());
-        prefault(uri.data(), text.size());
+        base::prefault(uri.data(), text.size());
         uri = text;
     }
     Object::writeJSON(writer, options);

@@ -1,10 +1,9 @@
 #include "GLTF/json_writer.h"
 
-#include "GLTF/prefault.h"
-
 #include "b_base64.h"
 #include "b_exception.h"
 #include "b_format.h"
+#include "b_pages.h"
 #include "b_string_convert.h"
 
 #include <rapidjson/internal/dtoa.h>
@@ -116,7 +115,7 @@ string_view JsonWriter::dataUriValue(string_view mimeType, const u8* bytes, std:
     // The text goes on where the closing quote of its beginning stands.
     os_->Pop(1);
     char* const encoded = os_->Push(length + 1);
-    prefault(encoded, length);
+    base::prefault(encoded, length);
     base::base64Encode(bytes, byteCount, encoded);
     encoded[length] = '"';
 

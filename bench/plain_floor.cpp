@@ -1,7 +1,7 @@
 #include "plain_floor.h"
 
-#include "GLTF/prefault.h"
 #include "b_base64.h"
+#include "b_pages.h"
 
 #include <cstring>
 #include <fcntl.h>
@@ -20,7 +20,7 @@ using Block = std::unique_ptr<u8[]>;
 
 Block allocate(std::size_t byteCount) {
     Block block(new u8[byteCount]);
-    GLTF::prefault(block.get(), byteCount);
+    base::prefault(block.get(), byteCount);
     return block;
 }
 

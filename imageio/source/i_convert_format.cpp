@@ -247,7 +247,7 @@ ref<Image> reject(const char* what) {
 
 } // namespace
 
-ref<Image> Image::convertFormat(u8 targetFormat, bool weighted, u32 options) {
+ref<Image> Image::convertFormat(u8 targetFormat, bool weighted, u32) {
     if (type_ >= typeCount || (type_ == IT_IMPLICIT && !isCompressed()))
         return reject("source image type");
     if (targetFormat == format_)
@@ -261,7 +261,7 @@ ref<Image> Image::convertFormat(u8 targetFormat, bool weighted, u32 options) {
 
     if (isCompressed()) {
         const ref<Image> plain = decodeBlocks(*this);
-        return plain ? plain->convertFormat(targetFormat, weighted, options) : plain;
+        return plain ? plain->convertFormat(targetFormat, weighted) : plain;
     }
     ref<Image> target = makeLike(*this, width_, height_, byteAlignment_, targetFormat, type_);
     if (target)

@@ -114,7 +114,7 @@ void convertRows(const Image& source, Image& target, Reader read, Writer write) 
     constexpr u32 pixelsAtATime = 256;
     float numbers[pixelsAtATime * 4];
     const u32 channels = source.channelCount();
-    const u32 colorCount = source.alphaIndex() < 0 ? channels : channels - 1;
+    const u32 colorCount = colorCountOf(source);
     const u32 sourceBytes = bitsPerPixel(source.type(), source.format()) / 8;
     const u32 targetBytes = bitsPerPixel(target.type(), target.format()) / 8;
     for (u64 y = 0; y < source.rowCount(); ++y) {

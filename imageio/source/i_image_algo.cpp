@@ -27,24 +27,30 @@ void forEachPixel(Image& image, Action action) {
     }
 }
 
-/// Alpha is the last component of a pixel, where there is one.
-u32 colorCountOf(const Image& image) {
-    return image.channelCount() - (image.alphaIndex() < 0 ? 0 : 1);
-}
-
 template <class T>
 inline constexpr bool isSignedInteger = isIntegerComponent<T>&& std::is_signed_v<T>;
 
-/// Types whose full value less a component is one of their range, which signed integers are not.
-bool isInverted(u8 type) {
-    return type == ImageTypes::IT_UNSIGNED_BYTE || type == ImageTypes::IT_UNSIGNED_SHORT ||
-           type == ImageTypes::IT_UNSIGNED_INT || type == ImageTypes::kHalf ||
-           type == ImageTypes::kFloat || type == ImageTypes::kDouble;
+/// Full value less a component is in the range of the type, which it is not for signed integers.
+template <class T>
+inline constexpr bool isInverted = !isSignedInteger<T>;
+template <class T>
+inline constexpr bool isEqualized = !isSignedInteger<T> && !std::is_same_v<T, half>;
+
+bool isInvertedType(u8 type) {
+    bool result = false;
+    dispatchType(type, [&](auto component) { result = isInverted<decltype(component)>; });
+    return result;
+}
+
+bool isEqualizedType(u8 type) {
+    bool result = false;
+    dispatchType(type, [&](auto component) { result = isEqualized<decltype(component)>; });
+    return result;
 }
 
 /// Components `first` to `first` + `count` of each pixel.
 bool invertComponents(Image& image, const char* operation, u32 first, u32 count) {
-    if (!isInverted(image.type()) || image.isCompressed()) {
+    if (!isInvertedType(image.type()) || image.isCompressed()) {
         logUnsupportedType(operation);
         return false;
     }
@@ -125,12 +131,6 @@ void stretch(Image& image, const Limits& limits) {
     });
 }
 
-bool isEqualizedType(u8 type) {
-    return type == ImageTypes::IT_UNSIGNED_BYTE || type == ImageTypes::IT_UNSIGNED_SHORT ||
-           type == ImageTypes::IT_UNSIGNED_INT || type == ImageTypes::kFloat ||
-           type == ImageTypes::kDouble;
-}
-
 bool checkEqualizedFormat(const Image& image) {
     if (!image.isCompressed())
         return true;
@@ -143,7 +143,7 @@ template <class FindLimits>
 void equalizeBy(Image& image, FindLimits findLimitsOf) {
     dispatchType(image.type(), [&](auto component) {
         using T = decltype(component);
-        if constexpr (!isSignedInteger<T> && !std::is_same_v<T, half>) {
+        if constexpr (isEqualized<T>) {
             const Limits limits = findLimitsOf(component);
             if (limits.canStretch(fullNumber<T>))
                 stretch<T>(image, limits);

@@ -5,6 +5,11 @@
 /// What the operations on pictures share.
 namespace iio {
 
+/// Components of a pixel before its alpha, which is the last one.
+inline u32 colorCountOf(const Image& image) noexcept {
+    return image.channelCount() - (image.alphaIndex() < 0 ? 0 : 1);
+}
+
 /// True if `image` has pixels; else a message that names the operation, as "Image::resize()".
 bool requirePixels(const Image& image, string_view operation);
 

@@ -95,10 +95,15 @@ bool open(PngReadFile& file) {
     return isOpen;
 }
 
-u8 formatOf(int channelCount) {
+u8 formatOf(const PngReadFile& file) {
     constexpr u8 formats[] = {ImageTypes::kLuminance, ImageTypes::kLuminanceAlpha, ImageTypes::kRGB,
                               ImageTypes::kRGBA};
-    return formats[channelCount - 1];
+    return formats[png_get_channels(file.png, file.info) - 1];
+}
+
+u8 typeOf(const PngReadFile& file) {
+    const bool isShort = png_get_bit_depth(file.png, file.info) == 16;
+    return isShort ? ImageTypes::IT_UNSIGNED_SHORT : ImageTypes::IT_UNSIGNED_BYTE;
 }
 
 /// Text of ISO 8859-1, whose characters are the first 256 of Unicode.
@@ -197,9 +202,8 @@ void describe(const PngReadFile& file, ImageInfo& info) {
     info.level0.width = png_get_image_width(file.png, file.info);
     info.level0.height = png_get_image_height(file.png, file.info);
     info.level0.depth = 1;
-    info.format = formatOf(png_get_channels(file.png, file.info));
-    info.type = png_get_bit_depth(file.png, file.info) == 16 ? ImageTypes::IT_UNSIGNED_SHORT
-                                                             : ImageTypes::IT_UNSIGNED_BYTE;
+    info.format = formatOf(file);
+    info.type = typeOf(file);
     describeTexts(file, info.attributes);
     describeColour(file, info.attributes);
     describeDensity(file, info.attributes);
@@ -237,10 +241,7 @@ ref<Image> readPng(base::Stream& stream) {
         return {};
     auto image = base::makeRef<Image>();
     image->create(png_get_image_width(file.png, file.info),
-                  png_get_image_height(file.png, file.info), 1, 1,
-                  formatOf(png_get_channels(file.png, file.info)),
-                  png_get_bit_depth(file.png, file.info) == 16 ? ImageTypes::IT_UNSIGNED_SHORT
-                                                               : ImageTypes::IT_UNSIGNED_BYTE);
+                  png_get_image_height(file.png, file.info), 1, 1, formatOf(file), typeOf(file));
     if (!image->data() || !readPixels(file, *image))
         return {};
     // Only now, for texts and date may follow the pixels.
