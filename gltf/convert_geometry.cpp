@@ -130,7 +130,8 @@ bool hasIndexOutOfRange(const GLTF::Mesh& gltfMesh, const MeshIndices& indices) 
 
 } // namespace
 
-ref<GLTF::Mesh> GLTFScenePlugin::convertMesh(scene::IMesh& mesh, bool withTargets) {
+ref<GLTF::Mesh> GLTFScenePlugin::convertMesh(scene::IMesh& mesh, u32 materialIndex,
+                                             bool withTargets) {
     convertToSingleIndex(mesh, morphBases_.contains(&mesh));
     triangulate(mesh, false, true);
 
@@ -138,7 +139,7 @@ ref<GLTF::Mesh> GLTFScenePlugin::convertMesh(scene::IMesh& mesh, bool withTarget
     if (const string* name = find(mesh, scene::geometry_schema::n_name))
         gltfMesh->name = *name;
     MeshIndices indices(mesh);
-    const bool allTriangles = convertPrimitives(*gltfMesh, mesh, indices);
+    const bool allTriangles = convertPrimitives(*gltfMesh, mesh, materialIndex, indices);
     if (gltfMesh->primitives.empty()) {
         log().log(logScene, base::logWarning, "validate |{}| Mesh doesn't contain any primitives!",
                   mesh.getName());
@@ -158,7 +159,7 @@ ref<GLTF::Mesh> GLTFScenePlugin::convertMesh(scene::IMesh& mesh, bool withTarget
 }
 
 /// Returns whether all primitives are lists of triangles.
-bool GLTFScenePlugin::convertPrimitives(GLTF::Mesh& gltfMesh, scene::IMesh& mesh,
+bool GLTFScenePlugin::convertPrimitives(GLTF::Mesh& gltfMesh, scene::IMesh& mesh, u32 materialIndex,
                                         MeshIndices& indices) {
     const u32 listCount = getListCount(mesh, mesh_schema::n_primitives);
     const u32 primitiveCount = countPrimitives(mesh);
@@ -185,7 +186,6 @@ bool GLTFScenePlugin::convertPrimitives(GLTF::Mesh& gltfMesh, scene::IMesh& mesh
 
         const i32 type = drawnType(mesh, i, indices.isTriangulated());
         allTriangles &= type == scene::primitiveTriangles;
-        // No material: the primitive shows the default one of the reader.
         auto primitive = base::makeRef<GLTF::Primitive>();
         primitive->mode = modeOf(type);
         if (primitive->mode < 0)
@@ -193,6 +193,8 @@ bool GLTFScenePlugin::convertPrimitives(GLTF::Mesh& gltfMesh, scene::IMesh& mesh
                       "gltf |{}| Primitive {} is of no kind that can be drawn!", mesh.getName(), i);
         if (view)
             primitive->indices = makeIndices(range, view);
+        if (const auto* materials = find(*source, meshPrimitive_schema::n_materials))
+            assignMaterial(*primitive, *materials, materialIndex, &mesh);
         gltfMesh.primitives.push_back(std::move(primitive));
     }
     return allTriangles;

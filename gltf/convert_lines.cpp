@@ -105,7 +105,8 @@ vec3f readEdgeColor(const scene::ILines& lines) {
 
 } // namespace
 
-ref<GLTF::Mesh> GLTFScenePlugin::convertLines(scene::ILines& lines, bool hasAssignment) {
+ref<GLTF::Mesh> GLTFScenePlugin::convertLines(scene::ILines& lines, base::u32 materialIndex,
+                                              bool hasAssignment) {
     VertexArray points = findVertexArray<vec3f, vec4f>(lines, lines_schema::n_points);
     if (!points)
         return nullptr;
@@ -129,9 +130,10 @@ ref<GLTF::Mesh> GLTFScenePlugin::convertLines(scene::ILines& lines, bool hasAssi
     else
         setBounds(*position, lines.getBounds());
     primitive->attributes["POSITION"] = std::move(position);
-    // Free lines have no material: they show the default one of the reader.
     if (hasAssignment)
         primitive->material = getEdgeMaterial(lines);
+    else if (const auto* materials = find(lines, lines_schema::n_materials))
+        assignMaterial(*primitive, *materials, materialIndex, nullptr);
     gltfMesh->primitives.push_back(std::move(primitive));
     ++linesIndex;
     return gltfMesh;

@@ -92,6 +92,18 @@ IPlugin* findBaseMesh(IPlugin& child) {
     return object && object->typeName() == scene::mesh_schema::n_kind ? object : nullptr;
 }
 
+/// The slot of materials for a node and what is below it: its own, else that from above. A
+/// negative one lies past the end of every list.
+u32 readMaterialIndex(const IPlugin& node, u32 inherited) {
+    const base::Attribute* index = node.findAttribute(scene::node_schema::n_materialIndex);
+    if (!index)
+        return inherited;
+    if (index->type() == base::TypeTraits<u32>::n_name)
+        return *static_cast<const u32*>(index->data());
+    const base::i32* value = find(node, scene::node_schema::n_materialIndex);
+    return value ? static_cast<u32>(*value) : inherited;
+}
+
 /// True for the edges of a mesh: lines assigned to an object or to faces.
 bool hasAssignment(const IPlugin& lines) {
     const name_id name = scene::lines_schema::n_assignment;
@@ -141,7 +153,11 @@ mat43 GLTFScenePlugin::findParentFromNode(const scene::INode& node, const TreePo
 }
 
 ref<GLTF::Node> GLTFScenePlugin::convertRoot(const scene::INode& root, u8 upAxis) {
-    const TreePosition position{root, nullptr, 1, root.hasTransformChannels(),
+    const TreePosition position{root,
+                                nullptr,
+                                1,
+                                readMaterialIndex(root, 0),
+                                root.hasTransformChannels(),
                                 findParentFromNode(root, nullptr)};
     const auto gltfRoot = base::makeRef<GLTF::Node>();
     // Always a matrix: the turn of the axes can't be a part of animated values.
@@ -168,7 +184,7 @@ void GLTFScenePlugin::convertNode(GLTF::Node& gltfNode, const TreePosition& posi
         walkedNodes_[&position.node] = false;
     for (const scene::Object& child : *children) {
         if (child)
-            convertObject(gltfNode, *child);
+            convertObject(gltfNode, *child, position.materialIndex);
     }
 }
 
@@ -183,7 +199,11 @@ void GLTFScenePlugin::convertChildNode(GLTF::Node& gltfNode, IPlugin& child,
     ++nodeCount_;
     setName(*gltfChild, *node);
 
-    const TreePosition position{*node, &parent, parent.level + 1, node->hasTransformChannels(),
+    const TreePosition position{*node,
+                                &parent,
+                                parent.level + 1,
+                                readMaterialIndex(*node, parent.materialIndex),
+                                node->hasTransformChannels(),
                                 findParentFromNode(*node, &parent)};
     convertTransform(position, *gltfChild);
     gltfNode.children.push_back(gltfChild);
@@ -232,38 +252,39 @@ GLTF::Node* GLTFScenePlugin::attachMesh(GLTF::Node& gltfNode, ref<GLTF::Mesh> me
 }
 
 /// Cameras, lights, hair, points and instancers leave no trace in the document.
-void GLTFScenePlugin::convertObject(GLTF::Node& gltfNode, IPlugin& child) {
+void GLTFScenePlugin::convertObject(GLTF::Node& gltfNode, IPlugin& child, u32 materialIndex) {
     const name_id kind = child.typeName();
     if (kind == scene::mesh_schema::n_kind) {
-        convertMeshChild(gltfNode, child, false);
+        convertMeshChild(gltfNode, child, materialIndex, false);
     } else if (kind == scene::lines_schema::n_kind) {
-        convertLinesChild(gltfNode, child);
+        convertLinesChild(gltfNode, child, materialIndex);
     } else if (kind == scene::skin_schema::n_kind) {
         // The mesh in its rest pose; the holder gets no skin.
         if (IPlugin* baseMesh = findBaseMesh<scene::ISkin>(child))
-            convertMeshChild(gltfNode, *baseMesh, false);
+            convertMeshChild(gltfNode, *baseMesh, materialIndex, false);
     } else if (kind == scene::morph_schema::n_kind) {
         // The mesh as it is without its targets.
         if (IPlugin* baseMesh = findBaseMesh<scene::IMorph>(child))
-            convertMeshChild(gltfNode, *baseMesh, true);
+            convertMeshChild(gltfNode, *baseMesh, materialIndex, true);
     }
 }
 
-void GLTFScenePlugin::convertMeshChild(GLTF::Node& gltfNode, IPlugin& child, bool withTargets) {
+void GLTFScenePlugin::convertMeshChild(GLTF::Node& gltfNode, IPlugin& child, u32 materialIndex,
+                                       bool withTargets) {
     auto* mesh = findClass<scene::IMesh>(child);
     if (!mesh)
         return;
     const auto [entry, isNew] = meshMap.try_emplace(mesh, nullptr);
     ref<GLTF::Mesh> gltfMesh = entry->second;
     if (isNew) {
-        gltfMesh = convertMesh(*mesh, withTargets);
+        gltfMesh = convertMesh(*mesh, materialIndex, withTargets);
         entry->second = gltfMesh.get();
     }
     if (gltfMesh)
         attachMesh(gltfNode, std::move(gltfMesh));
 }
 
-void GLTFScenePlugin::convertLinesChild(GLTF::Node& gltfNode, IPlugin& child) {
+void GLTFScenePlugin::convertLinesChild(GLTF::Node& gltfNode, IPlugin& child, u32 materialIndex) {
     auto* lines = findClass<scene::ILines>(child);
     if (!lines)
         return;
@@ -273,7 +294,7 @@ void GLTFScenePlugin::convertLinesChild(GLTF::Node& gltfNode, IPlugin& child) {
     const auto [entry, isNew] = linesMap.try_emplace(lines, nullptr);
     ref<GLTF::Mesh> gltfMesh = entry->second;
     if (isNew) {
-        gltfMesh = convertLines(*lines, isEdges);
+        gltfMesh = convertLines(*lines, materialIndex, isEdges);
         entry->second = gltfMesh.get();
     }
     if (gltfMesh)

@@ -30,16 +30,15 @@ public:
     explicit TakenFiles(const string& folder)
         : folder_(folder), current_(base::fs::master().curdir()) {}
 
-    /// The picture that an image was read from must stay as it is.
-    void addSource(const Image& image) {
-        if (!image.cacheKey.empty())
-            files_.try_emplace(keyOf(image.cacheKey), &image);
+    /// A picture that was read must stay as it is. `image` has its data; null if no image has.
+    void addSource(const string& path, const Image* image) {
+        files_.try_emplace(keyOf(path), image);
     }
     /// True if the file of that uri is free for the image or holds the same data; it is taken
     /// then.
     bool take(const string& uri, const Image& image) {
         const auto [entry, isNew] = files_.try_emplace(keyOf(folder_ + uri), &image);
-        return isNew || haveEqualData(*entry->second, image);
+        return isNew || (entry->second && haveEqualData(*entry->second, image));
     }
 
 private:
@@ -54,20 +53,48 @@ private:
     base::map<string, const Image*> files_;
 };
 
+/// The images that wanted one uri which another one has.
+class Namesakes {
+public:
+    /// A uri for the image: that of one with the same data, else the next free one.
+    string place(const Image& image, TakenFiles& taken) {
+        const auto* bytes = reinterpret_cast<const char*>(image.data);
+        const std::size_t hash = std::hash<string_view>()(
+            string_view(bytes, static_cast<std::size_t>(image.byteLength)));
+        for (const auto& [other, uri] : placed_[hash]) {
+            if (haveEqualData(*other, image))
+                return uri;
+        }
+        string uri;
+        do
+            uri = numbered(image.uri, next_++);
+        while (!taken.take(uri, image));
+        placed_[hash].push_back({&image, uri});
+        return uri;
+    }
+
+private:
+    int next_ = 2;
+    base::hash_map<std::size_t, base::vector<std::pair<const Image*, string>>> placed_;
+};
+
 } // namespace
 
-void makeUrisUnique(const base::vector<Image*>& images, const string& folder) {
+void makeUrisUnique(const base::vector<Image*>& images, const base::vector<string>& sources,
+                    const string& folder) {
     TakenFiles taken(folder);
     for (const Image* image : images) {
-        if (image->data)
-            taken.addSource(*image);
+        if (image->data && !image->cacheKey.empty())
+            taken.addSource(image->cacheKey, image);
     }
+    for (const string& path : sources)
+        taken.addSource(path, nullptr);
+    base::map<string, Namesakes> namesakes;
     for (Image* image : images) {
         if (!image->data || taken.take(image->uri, *image))
             continue;
         const string uri = image->uri;
-        for (int number = 2; !taken.take(image->uri, *image); ++number)
-            image->uri = numbered(uri, number);
+        image->uri = namesakes[base::toLower(uri)].place(*image, taken);
         base::log().log(base::logScene, base::logWarning,
                         "gltf |{}| Another image is called so, the file is written as '{}'!", uri,
                         image->uri);

@@ -197,11 +197,11 @@ void writeImages(const base::vector<Image*>& images, const string& folder) {
 } // namespace
 
 void writeOutputFiles(Asset& asset, const GLTF::Options& options, Buffer& buffer,
-                      const string& path) {
+                      const base::vector<string>& sources, const string& path) {
     const string folder = base::fs::folder(path);
     const base::vector<Image*> images = asset.getAllImages();
     if (!options.embedTextures)
-        makeUrisUnique(images, folder);
+        makeUrisUnique(images, sources, folder);
     if (options.binary && options.version == "1.0")
         buffer.stringId = "binary_glTF";
 

@@ -3,6 +3,7 @@
 #include "i_half.h"
 #include "i_image.h"
 
+#include <array>
 #include <limits>
 #include <type_traits>
 
@@ -23,6 +24,25 @@ float toNumber(T component) noexcept {
         return static_cast<float>(component) * componentScale<T>;
     else
         return static_cast<float>(component);
+}
+
+inline constexpr auto byteUnits = [] {
+    std::array<float, 256> units{};
+    for (u32 i = 0; i < 256; ++i)
+        units[i] = static_cast<float>(i) / 255.0f;
+    return units;
+}();
+
+/// The number of a component. Unsigned ones are divided by their maximum, which a product with its
+/// reciprocal, as `toNumber` takes it, does not equal in the last place.
+template <class C>
+float toUnit(C component) noexcept {
+    if constexpr (std::is_same_v<C, u8>)
+        return byteUnits[component];
+    else if constexpr (std::is_same_v<C, u16>)
+        return static_cast<float>(component) / 65535.0f;
+    else
+        return toNumber(component);
 }
 
 /// Clamped to the range of integers and truncated; not a number gives 0 there.

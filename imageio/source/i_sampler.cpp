@@ -18,25 +18,6 @@ using Colour = float[4];
 
 constexpr u32 mostTapsAlongAxis = 32;
 
-constexpr auto byteUnits = [] {
-    std::array<float, 256> units{};
-    for (u32 i = 0; i < 256; ++i)
-        units[i] = static_cast<float>(i) / 255.0f;
-    return units;
-}();
-
-/// The number of a component. Unsigned ones are divided by their maximum, which a product with its
-/// reciprocal, as conversions of pictures have it, does not equal in the last place.
-template <class C>
-float toUnit(C component) {
-    if constexpr (std::is_same_v<C, u8>)
-        return byteUnits[component];
-    else if constexpr (std::is_same_v<C, u16>)
-        return static_cast<float>(component) / 65535.0f;
-    else
-        return toNumber(component);
-}
-
 /// The coordinate inside 0..extent - 1 that stands for `i`; -1 for the border.
 i64 wrapped(i64 i, i64 extent, u32 mode) {
     if (i >= 0 && i < extent)

@@ -60,6 +60,7 @@ public:
     class SCENE_API Class : public Base, public type##_schema {                              \
     public:                                                                                  \
         using Schema = type##_schema;                                                        \
+        using Parent = Base;                                                                 \
         Class(base::ref<base::IPluginDesc> desc, base::PluginFactory* factory, base::u32 id) \
             : Base(std::move(desc), factory, id) {}                                          \
     };

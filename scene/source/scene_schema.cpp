@@ -3,6 +3,7 @@
 #include "scene.h"
 #include "scene_options.h"
 
+#include "b_attribute_desc.h"
 #include "b_cmdline.h"
 
 namespace scene {
@@ -49,9 +50,19 @@ const base::ref<base::IPluginDesc>& description() {
     return desc;
 }
 
+/// Tells what T's type derives from, up to the objects without a schema.
+template <class T>
+void registerClass() {
+    if constexpr (requires { typename T::Parent::Schema; }) {
+        base::attribDescManager().addClass(T::Schema::n_kind, T::Parent::Schema::n_kind);
+        registerClass<typename T::Parent>();
+    }
+}
+
 template <class... T>
 void registerTypes(base::PluginFactory& factory) {
     (factory.registerDesc(description<T>()), ...);
+    (registerClass<T>(), ...);
 }
 
 #define SCENE_INTERN(type) internNames(type##_schema::names());

@@ -277,7 +277,7 @@ struct TargetScene : MeshScene {
 
     bool convert(bool isWholeShape) {
         const auto exporter = base::makeRef<gltf::GLTFScenePlugin>(nullptr, nullptr, 0);
-        gltfMesh = exporter->convertMesh(mesh, false);
+        gltfMesh = exporter->convertMesh(mesh, 0, false);
         return exporter->convertMorphTarget(*gltfMesh, target, mesh, isWholeShape);
     }
     GLTF::Accessor* find(const char* name) {

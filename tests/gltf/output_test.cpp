@@ -137,7 +137,7 @@ struct ImageDocument {
         auto node = base::makeRef<GLTF::Node>();
         node->mesh = mesh;
         asset->getDefaultScene().nodes.push_back(node);
-        gltf::writeOutputFiles(*asset, options, *asset->packAccessors(), path);
+        gltf::writeOutputFiles(*asset, options, *asset->packAccessors(), {}, path);
     }
 
     base::ref<GLTF::Asset> asset = base::makeRef<GLTF::Asset>();

@@ -1,0 +1,72 @@
+#include "scene_image_record.h"
+
+#include "b_name.h"
+
+namespace scene {
+
+using base::AttribMap;
+using base::name_id;
+
+namespace {
+
+struct Names {
+    name_id list = base::nameServer().id("exportedImages");
+    name_id name = base::nameServer().id("name");
+    name_id sources = base::nameServer().id("sources");
+    name_id work = base::nameServer().id("work");
+    name_id width = base::nameServer().id("width");
+    name_id height = base::nameServer().id("height");
+    name_id byteLength = base::nameServer().id("byteLength");
+};
+
+const Names& names() {
+    static const Names interned;
+    return interned;
+}
+
+template <class T>
+void take(const AttribMap& item, name_id name, T& value) {
+    if (const T* found = item.findAttribute<T>(name))
+        value = *found;
+}
+
+} // namespace
+
+void storeImageRecords(AttribMap& scene, const base::vector<ImageRecord>& records) {
+    const Names& n = names();
+    scene.removeAttribute(n.list);
+    base::AttribArray& list = scene.arrayAttribute(n.list);
+    list.setFlags(list.flags() | base::attribTransient);
+    for (const ImageRecord& record : records) {
+        auto* item = new AttribMap;
+        list.append(item);
+        item->attribute<base::string>(n.name) = record.name;
+        item->vecAttribute<base::string>(n.sources) = record.sources;
+        item->attribute<base::u8>(n.work) = static_cast<base::u8>(record.work);
+        item->attribute<base::i32>(n.width) = record.width;
+        item->attribute<base::i32>(n.height) = record.height;
+        item->attribute<base::u32>(n.byteLength) = record.byteLength;
+    }
+}
+
+base::vector<ImageRecord> findImageRecords(const AttribMap& scene) {
+    const Names& n = names();
+    base::vector<ImageRecord> records;
+    const base::AttribArray* list = scene.findArray(n.list);
+    for (base::u32 i = 0; list && i < list->size(); ++i) {
+        const AttribMap* item = list->item(i)->asMap();
+        ImageRecord& record = records.emplace_back();
+        take(*item, n.name, record.name);
+        if (const auto* sources = item->findVecAttribute<base::string>(n.sources))
+            record.sources = *sources;
+        base::u8 work = 0;
+        take(*item, n.work, work);
+        record.work = static_cast<ImageRecord::Work>(work);
+        take(*item, n.width, record.width);
+        take(*item, n.height, record.height);
+        take(*item, n.byteLength, record.byteLength);
+    }
+    return records;
+}
+
+} // namespace scene
