@@ -223,13 +223,19 @@ public:
     };
     /// Size in pixels from the header of a PNG or JPEG; -1, -1 for all else.
     Dimensions getDimensions() const;
+    /// Copies the bytes to `view`, where they fit; `data` are those there from then on. So there
+    /// is but one copy of a picture at a time.
+    void moveInto(ref<BufferView> view);
 
     string uri;
-    u8* data = nullptr; ///< owned
+    u8* data = nullptr; ///< owned, unless it was moved into a buffer
     i32 byteLength = 0;
     string mimeType;
     ref<BufferView> bufferView; ///< set when the image lies in the binary buffer
     string cacheKey;
+
+private:
+    bool ownsData_ = true;
 };
 
 class Sampler : public Object {

@@ -109,7 +109,18 @@ Image::Image(string imageUri, u8* bytes, i32 length, const string& fileExtension
 Image::~Image() {
     if (const auto entry = cache().find(cacheKey); entry != cache().end() && entry->second == this)
         cache().erase(entry);
-    base::AllocPolicy::free(data);
+    if (ownsData_)
+        base::AllocPolicy::free(data);
+}
+
+void Image::moveInto(ref<BufferView> view) {
+    u8* target = view->buffer->data + view->byteOffset;
+    std::memcpy(target, data, static_cast<std::size_t>(byteLength));
+    if (ownsData_)
+        base::AllocPolicy::free(data);
+    data = target;
+    ownsData_ = false;
+    bufferView = std::move(view);
 }
 
 string Image::typeName() const {

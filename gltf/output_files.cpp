@@ -161,10 +161,9 @@ void packImages(const base::vector<Image*>& images, Buffer& buffer) {
         // An image that could not be read is referred to by its uri alone.
         if (!image->data || image->byteLength <= 0)
             continue;
-        image->bufferView = base::makeRef<GLTF::BufferView>(
-            buffer.byteLength, image->byteLength, ref<Buffer>(&buffer), GLTF::BufferView::noTarget);
-        std::memcpy(data + buffer.byteLength, image->data,
-                    static_cast<std::size_t>(image->byteLength));
+        image->moveInto(base::makeRef<GLTF::BufferView>(buffer.byteLength, image->byteLength,
+                                                        ref<Buffer>(&buffer),
+                                                        GLTF::BufferView::noTarget));
         buffer.byteLength += image->byteLength;
     }
 }
