@@ -6,6 +6,7 @@
 
 #include "stream/b_fs.h"
 
+#include <filesystem>
 #include <limits>
 
 namespace gltf {
@@ -181,11 +182,22 @@ void writeMainFile(Asset& asset, const GLTF::Options& options, const Buffer& buf
     });
 }
 
+/// True if `path` is the very file that the image was read from.
+bool isSource(const string& path, const Image& image) {
+    const base::fs::MasterFS& files = base::fs::master();
+    std::error_code error;
+    return !image.cacheKey.empty() &&
+           std::filesystem::equivalent(files.resolve(path), files.resolve(image.cacheKey), error);
+}
+
 void writeImages(const base::vector<Image*>& images, const string& folder) {
     for (const Image* image : images) {
+        const string path = folder + image->uri;
         if (image->data && image->byteLength > 0)
-            guarded(imageMessage,
-                    [&] { writeFile(folder + image->uri, image->data, image->byteLength); });
+            guarded(imageMessage, [&] {
+                if (!isSource(path, *image))
+                    writeFile(path, image->data, image->byteLength);
+            });
         else
             base::log().log(base::logScene, base::logWarning,
                             "gltf |{}| The image has no data, its file is not written!",
