@@ -241,8 +241,8 @@ void PolygonImport::writeTextureCoordinates() {
             continue;
         using Schema = scene::meshUVSet_schema;
         AttribMap& set = appendItem<Schema>(object_, mesh_schema::n_uvSets);
-        if (mesh_.HasTextureCoordsName(i))
-            write(set, Schema::n_name) = viewOf(*mesh_.GetTextureCoordsName(i));
+        if (const base::string name = textureSetName(mesh_, i); !name.empty())
+            write(set, Schema::n_name) = name;
         const bool isDeep =
             mesh_.mNumUVComponents[i] > 2 &&
             std::ranges::any_of(selection_.vertices, [&](u32 v) { return coordinates[v].z != 0; });
@@ -332,6 +332,26 @@ void PolygonImport::writePrimitive() {
 }
 
 } // namespace
+
+base::string textureSetName(const aiMesh& mesh, u32 channel) {
+    vector<base::string> names;
+    if (channel >= AI_MAX_NUMBER_OF_TEXTURECOORDS || !mesh.mTextureCoords[channel])
+        return {};
+    const auto isTaken = [&](const base::string& name) {
+        return std::ranges::find(std::as_const(names), name) != names.cend();
+    };
+    for (u32 i = 0; i <= channel; ++i) {
+        if (!mesh.mTextureCoords[i])
+            continue;
+        base::string name(mesh.HasTextureCoordsName(i) ? viewOf(*mesh.GetTextureCoordsName(i))
+                                                       : "");
+        if (!names.empty() && (name.empty() || isTaken(name)))
+            for (name = "UV" + std::to_string(i); isTaken(name);)
+                name += '_';
+        names.push_back(name);
+    }
+    return names.back();
+}
 
 void importPolygons(const aiMesh& mesh, const GeometrySettings& settings, MeshFaces faces,
                     vector<vec3f> positions, AttribMap& object, GeometryFaults& faults) {

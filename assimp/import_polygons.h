@@ -5,6 +5,11 @@
 
 namespace assimp {
 
+/// The name of the set of texture coordinates in `channel`, by which textures select it: that in
+/// the file, but another one where it has none or an earlier set has it too. The first set keeps
+/// its name or has none. Empty if there is no such set.
+base::string textureSetName(const aiMesh& mesh, base::u32 channel);
+
 /// Fills `object`, an empty `mesh`, with the polygons of `mesh`, of which there is at least one.
 /// `positions` are those of all its vertices, finite.
 void importPolygons(const aiMesh& mesh, const GeometrySettings& settings, MeshFaces faces,

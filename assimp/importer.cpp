@@ -2,6 +2,7 @@
 
 #include "assimp/import_axes.h"
 #include "assimp/import_geometry.h"
+#include "assimp/import_materials.h"
 #include "assimp/import_nodes.h"
 #include "assimp/library_text.h"
 #include "assimp/ply_header.h"
@@ -17,6 +18,7 @@
 #include <assimp/scene.h>
 
 #include <algorithm>
+#include <optional>
 
 namespace assimp {
 
@@ -54,31 +56,43 @@ public:
     }
 };
 
+/// Errors of the library's after which nothing is missing: what it does without materials of the
+/// file's own, and that it looked for another MTL file in vain, as it has told of the first.
+constexpr base::string_view harmlessErrors[] = {"FBX: no material assigned",
+                                                "OBJ: No object detected to attach",
+                                                "OBJ: Unable to locate fallback material file"};
+
 /// Keeps the errors that the library goes on after: what it could not read is missing then. Those
-/// about materials are left out, as materials are not taken over.
+/// about materials are left out if materials are not taken over.
 class LibraryErrors final : public Assimp::LogStream {
 public:
-    explicit LibraryErrors(base::vector<base::string>& texts) : texts_(texts) {}
+    LibraryErrors(base::vector<base::string>& texts, bool materials)
+        : texts_(texts), materials_(materials) {}
     void write(const char* message) override {
-        const base::string_view text = base::trimmed(message);
-        if (text.find("aterial") != text.npos)
-            return;
+        base::string_view text = base::trimmed(message);
         const std::size_t mark = text.find(": "); // behind "Error, T0"
-        texts_.push_back(base::string(text.substr(mark == text.npos ? 0 : mark + 2)));
+        text.remove_prefix(mark == text.npos ? 0 : mark + 2);
+        const auto isStart = [&](base::string_view start) { return text.starts_with(start); };
+        if (std::ranges::any_of(harmlessErrors, isStart) ||
+            (!materials_ && text.find("aterial") != text.npos))
+            return;
+        texts_.push_back(base::string(text));
     }
 
 private:
     base::vector<base::string>& texts_;
+    bool materials_;
 };
 
 /// While it lives the library's errors are kept and its messages passed on, if the log takes any of
 /// that level. The library has no logger else and writes nowhere.
 class LibraryLog {
 public:
-    explicit LibraryLog(base::vector<base::string>& errors) {
+    LibraryLog(base::vector<base::string>& errors, bool materials) {
         using Assimp::Logger;
         Assimp::DefaultLogger::create("", Logger::NORMAL, 0);
-        Assimp::DefaultLogger::get()->attachStream(new LibraryErrors(errors), Logger::Err);
+        Assimp::DefaultLogger::get()->attachStream(new LibraryErrors(errors, materials),
+                                                   Logger::Err);
         if (base::log().levelLimit() >= base::logDebug)
             Assimp::DefaultLogger::get()->attachStream(new LibraryMessages,
                                                        Logger::Err | Logger::Warn | Logger::Info);
@@ -105,10 +119,10 @@ bool isEmpty(const aiScene& scene) {
 }
 
 /// Null, with the reason in `error`, if the file can't be read. The steps of the library that
-/// change a scene are not used.
-std::unique_ptr<aiScene> readFile(const base::string& path, base::string& error) {
+/// change a scene are not used. `materials` tells whether they are of interest.
+std::unique_ptr<aiScene> readFile(const base::string& path, bool materials, base::string& error) {
     base::vector<base::string> errors;
-    const LibraryLog log(errors);
+    const LibraryLog log(errors, materials);
     try {
         if (!isPlyHeaderWhole(path)) {
             error = "The header has no end.";
@@ -136,18 +150,32 @@ std::unique_ptr<aiScene> readFile(const base::string& path, base::string& error)
     return nullptr;
 }
 
-/// The objects of every mesh of the file. Each mesh is freed as soon as it has been taken over.
+/// The objects of every mesh of the file, with their materials unless `materials` is null. Each
+/// mesh is freed as soon as it has been taken over.
 base::vector<GeometryObjects> importMeshes(aiScene& source, const GeometrySettings& settings,
-                                           base::PluginFactory& factory, const base::string& path) {
+                                           base::PluginFactory& factory, MaterialImport* materials,
+                                           const base::string& path) {
     base::vector<GeometryObjects> geometry;
     GeometryFaults faults;
     for (base::u32 i = 0; i < source.mNumMeshes; ++i) {
         geometry.push_back(importGeometry(*source.mMeshes[i], settings, factory, faults));
+        if (materials)
+            materials->assign(*source.mMeshes[i], geometry.back());
         delete source.mMeshes[i];
         source.mMeshes[i] = nullptr;
     }
     faults.report(path);
+    if (materials)
+        materials->faults().report(path);
     return geometry;
+}
+
+/// Makes the scene keep an object of the import's as long as it lives.
+void keep(base::IPlugin& scene, const base::ref<base::IPlugin>& object) {
+    const base::name_id name = base::nameServer().id("importedPictures");
+    scene.attribute<base::ref<base::IPlugin>>(name) = object;
+    base::Attribute& attribute = *scene.findAttribute(name);
+    attribute.setFlags(attribute.flags() | base::attribTransient);
 }
 
 } // namespace
@@ -183,8 +211,9 @@ bool AssimpImporter::canLoad(const base::string& path) {
 }
 
 bool AssimpImporter::load(base::PluginFactory& scene, const base::string& path) {
+    const bool hasMaterials = read(*this, scene::sceneImporter_schema::n_importMaterials);
     base::string error;
-    const std::unique_ptr<aiScene> source = readFile(path, error);
+    const std::unique_ptr<aiScene> source = readFile(path, hasMaterials, error);
     if (!source || !source->mRootNode) {
         base::log().log(base::logIO, base::logError, "assimp |{}| Unable to read the file: {}",
                         path, source ? "It has no nodes." : base::string(base::trimmed(error)));
@@ -193,8 +222,11 @@ bool AssimpImporter::load(base::PluginFactory& scene, const base::string& path) 
     if (source->mNumMeshes == 0)
         base::log().log(base::logIO, base::logWarning, "assimp |{}| The file has no geometry!",
                         path);
-    const base::vector<GeometryObjects> geometry =
-        importMeshes(*source, GeometrySettings(*this), scene, path);
+    std::optional<MaterialImport> materials;
+    if (hasMaterials)
+        materials.emplace(*source, path, *this, scene);
+    const base::vector<GeometryObjects> geometry = importMeshes(
+        *source, GeometrySettings(*this), scene, materials ? &*materials : nullptr, path);
     const base::string extension = base::toLower(base::fs::extension(path));
     const SceneAxes axes = readAxes(*source, extension == "dae" || extension == "3ds");
     base::ref<base::IPlugin> root =
@@ -206,6 +238,8 @@ bool AssimpImporter::load(base::PluginFactory& scene, const base::string& path) 
     write(*object, Schema::n_root) = std::move(root);
     if (axes.upAxis != Schema::n_upAxis.defaultValue)
         write(*object, Schema::n_upAxis) = axes.upAxis;
+    if (materials && materials->pictures())
+        keep(*object, materials->pictures());
     return true;
 }
 

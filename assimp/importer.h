@@ -28,6 +28,8 @@ public:
 /// | `computeNormalsMethod`, `computeNormalsAngle` | how they are computed |
 /// | `importTangents` | the same; they need normals, and texture coordinates to be computed |
 /// | `flipNormals` | faces are wound the other way, normals negated |
+/// | `importMaterials` | materials and their textures are read |
+/// | `resourcePaths` | an array of folders in which textures are looked for too |
 ///
 /// No format of the library's gives edges apart from line faces, surfaces or subdivision as such,
 /// or velocities, so `importEdges`, `importSurfaces`, `importTriangulateSurfaces`,
@@ -40,7 +42,8 @@ public:
     /// True if the file exists and its extension is among those of the description.
     bool canLoad(const base::string& path) override;
     /// Adds a `scene` object with the file's tree of nodes. What the library can't read is logged
-    /// as one error; nothing is added then.
+    /// as one error; nothing is added then. Pictures inside the file, and those of formats that
+    /// exporters can't read, become files in a private folder that goes when the scene does.
     bool load(base::PluginFactory& scene, const base::string& path) override;
 };
 

@@ -13,6 +13,8 @@ struct FbxText {
     std::string layers;     ///< elements of the geometry, a square from the origin in the XY plane
     std::string properties; ///< of the model "panel", which has the geometry
     bool hasTwins = false;  ///< "panel" has two children and not one
+    /// Further objects and their connections. A material for "panel" has the number 40.
+    std::string objects{}, connections{};
 
     std::string text() const {
         const auto number = [](const char* name, int value) {
@@ -37,10 +39,42 @@ struct FbxText {
                "}\n}\n"
                "Model: 21, \"Model::child\", \"Null\" {\nVersion: 232\n}\n" +
                (hasTwins ? "Model: 22, \"Model::twin\", \"Null\" {\nVersion: 232\n}\n" : "") +
-               "}\nConnections:  {\nC: \"OO\",20,0\nC: \"OO\",10,20\nC: \"OO\",21,20\n" +
-               (hasTwins ? "C: \"OO\",22,20\n" : "") + "}\n";
+               objects + "}\nConnections:  {\nC: \"OO\",20,0\nC: \"OO\",10,20\nC: \"OO\",21,20\n" +
+               (hasTwins ? "C: \"OO\",22,20\n" : "") +
+               (objects.empty() ? "" : "C: \"OO\",40,20\n") + connections + "}\n";
     }
 
+    /// Adds the material "paint".
+    void addMaterial(const std::string& values) {
+        layers += "LayerElementMaterial: 0 {\nVersion: 101\nName: \"\"\n"
+                  "MappingInformationType: \"AllSame\"\n"
+                  "ReferenceInformationType: \"IndexToDirect\"\nMaterials: *1 {\na: 0\n}\n}\n"
+                  "Layer: 0 {\nVersion: 100\nLayerElement:  {\nType: \"LayerElementMaterial\"\n"
+                  "TypedIndex: 0\n}\n}\n";
+        objects += "Material: 40, \"Material::paint\", \"\" {\nVersion: 102\n"
+                   "ShadingModel: \"phong\"\nProperties70:  {\n" +
+                   values + "}\n}\n";
+    }
+    /// Adds a texture, and a picture inside the file if `content`, in base64, is not empty.
+    void addTexture(int id, const std::string& file, const std::string& use,
+                    const std::string& values = "", const std::string& content = "") {
+        const std::string number = std::to_string(id), video = std::to_string(id + 1000);
+        objects += "Texture: " + number + ", \"Texture::t\", \"\" {\nFileName: \"" + file +
+                   "\"\nRelativeFilename: \"" + file + "\"\nProperties70:  {\n" + values + "}\n}\n";
+        connections += "C: \"OP\"," + number + ",40, \"" + use + "\"\n";
+        if (content.empty())
+            return;
+        objects += "Video: " + video + ", \"Video::v\", \"Clip\" {\nType: \"Clip\"\nFileName: \"" +
+                   file + "\"\nRelativeFilename: \"" + file + "\"\nContent: ,\n\"" + content +
+                   "\"\n}\n";
+        connections += "C: \"OO\"," + video + "," + number + "\n";
+    }
+    static std::string colorProperty(const std::string& name, const std::string& values) {
+        return "P: \"" + name + "\", \"Color\", \"\", \"A\"," + values + "\n";
+    }
+    static std::string numberProperty(const std::string& name, const std::string& value) {
+        return "P: \"" + name + "\", \"Number\", \"\", \"A\"," + value + "\n";
+    }
     static std::string vectorProperty(const std::string& name, const std::string& values) {
         return "P: \"" + name + "\", \"Vector3D\", \"Vector\", \"\"," + values + "\n";
     }

@@ -82,6 +82,7 @@ TEST_F(Importer, FilesThatCannotBeReadGiveOneErrorAndNothingElse) {
 
 TEST_F(Importer, MessagesOfTheLibraryAreForDebugging) {
     const string path = write("model.obj", "mtllib missing.mtl\n" + string(triangle));
+    set(Settings::n_importMaterials, false);
     LogCapture log;
     ASSERT_TRUE(loadPath(path));
     bool found = false;
@@ -94,6 +95,16 @@ TEST_F(Importer, MessagesOfTheLibraryAreForDebugging) {
     base::log().setLevelLimit(base::logInformation);
     ASSERT_TRUE(loadPath(path));
     EXPECT_TRUE(log.entries().empty());
+}
+
+TEST_F(Importer, MissingMaterialFilesAreWarnedOfOnce) {
+    const string path =
+        write("model.obj", "mtllib missing.mtl\nv 0 0 0\nv 1 0 0\nv 0 1 0\nusemtl a\nf 1 2 3\n");
+    LogCapture log;
+    ASSERT_TRUE(loadPath(path));
+    const string start = "3 assimp |" + path + "| OBJ: ";
+    EXPECT_EQ(problems(log), start + "Unable to locate material file missing.mtl\n" + start +
+                                 "failed to locate material a, creating new material\n");
 }
 
 TEST_F(Importer, ErrorsThatTheLibraryGoesOnAfterAreWarnings) {

@@ -1,0 +1,105 @@
+#include "assimp/embedded_textures.h"
+
+#include "assimp/library_text.h"
+#include "assimp/picture_decoding.h"
+#include "assimp/picture_folder.h"
+
+#include "b_exception.h"
+#include "b_string_convert.h"
+#include "stream/b_fs.h"
+
+#include <assimp/scene.h>
+
+#include <cstring>
+
+namespace assimp {
+
+namespace fs = base::fs;
+using base::string;
+using base::string_view;
+using base::u32;
+using base::u64;
+using base::u8;
+
+namespace {
+
+[[noreturn]] void fail(const char* reason) {
+    throw base::exception(reason, "embedded_textures", "assimp::writeEmbedded", __LINE__);
+}
+
+/// The extension of a file with these bytes: by what they are, else as the library or the name
+/// has it.
+string extensionOf(const aiTexture& texture, std::span<const u8> bytes, const string& name) {
+    const string_view hint(texture.achFormatHint,
+                           strnlen(texture.achFormatHint, sizeof texture.achFormatHint));
+    const string named = fs::extension(name);
+    switch (kindOf(bytes, named.empty() ? hint : string_view(named))) {
+    case PictureKind::png:
+        return "png";
+    case PictureKind::jpeg:
+        return "jpg";
+    case PictureKind::tga:
+        return "tga";
+    default:
+        return hint.empty() ? named : string(hint);
+    }
+}
+
+string writeCompressed(const aiTexture& texture, const string& name, PictureFolder& folder) {
+    const std::span bytes(reinterpret_cast<const u8*>(texture.pcData), texture.mWidth);
+    if (kindOf(bytes, fs::extension(name)) == PictureKind::convertible)
+        if (const Bytes png = convertToPng(bytes); !png.empty())
+            return folder.add(fs::stem(name), "png", {png.data(), png.size()});
+    return folder.add(fs::stem(name), extensionOf(texture, bytes, name), bytes);
+}
+
+/// Texels that are not in a format of their own.
+string writeTexels(const aiTexture& texture, const string& name, PictureFolder& folder) {
+    const u64 count = u64(texture.mWidth) * texture.mHeight;
+    if (count > (u64(1) << 26))
+        fail("It has more than 2^26 pixels.");
+    Bytes texels;
+    texels.reserve(count * 4);
+    for (const aiTexel& t : std::span(texture.pcData, count))
+        for (const u8 component : {t.r, t.g, t.b, t.a})
+            texels.push_back(component);
+    const Bytes png = encodePng({texels.cbegin(), texels.size()}, texture.mWidth, texture.mHeight);
+    if (png.empty())
+        fail("It can't be encoded.");
+    return folder.add(fs::stem(name), "png", {png.data(), png.size()});
+}
+
+} // namespace
+
+const aiTexture* findEmbedded(const aiScene& scene, string_view path) {
+    const std::span textures(scene.mTextures, scene.mTextures ? scene.mNumTextures : 0);
+    if (path.starts_with('*')) {
+        u32 index = 0;
+        return base::tryFromString(path.substr(1), index) && index < textures.size()
+                   ? textures[index]
+                   : nullptr;
+    }
+    const aiTexture* sameFile = nullptr;
+    for (const aiTexture* texture : textures) {
+        if (!texture || texture->mFilename.length == 0)
+            continue;
+        const string_view name = viewOf(texture->mFilename);
+        if (name == path)
+            return texture;
+        if (!sameFile && fs::fileName(name) == fs::fileName(path))
+            sameFile = texture;
+    }
+    return sameFile;
+}
+
+string writeEmbedded(const aiTexture& texture, string_view path, PictureFolder& folder) {
+    if (!texture.pcData || texture.mWidth == 0)
+        fail("It is empty.");
+    string name = fs::fileName(viewOf(texture.mFilename));
+    if (name.empty())
+        name = path.starts_with('*') ? "texture" + string(path.substr(1)) : fs::fileName(path);
+    return texture.mHeight == 0 ? writeCompressed(texture, name, folder)
+                                : writeTexels(texture, name, folder);
+}
+
+} // namespace assimp

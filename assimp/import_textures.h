@@ -1,0 +1,67 @@
+#pragma once
+
+#include "assimp/material_properties.h"
+#include "assimp/picture_folder.h"
+#include "assimp/texture_search.h"
+
+#include "scene_schema.h"
+
+#include <tuple>
+
+struct aiMesh;
+struct aiScene;
+
+namespace assimp {
+
+/// The first texture of a kind at a material.
+struct TextureSlot {
+    base::string path; ///< as the file has it
+    base::string file; ///< where that is; empty if it was not found
+    scene::Enumeration wrapU = 0, wrapV = 0;
+    base::u32 channel = 0; ///< which of the library's sets of coordinates
+
+    explicit operator bool() const { return !file.empty(); }
+};
+
+/// Makes the textures of a file. Those that are alike are one object, and each picture is looked
+/// for once.
+class TextureImport {
+public:
+    /// `source` and `factory` are borrowed. `path` is that of the model.
+    TextureImport(const aiScene& source, const base::string& path,
+                  base::vector<base::string> resourcePaths, base::PluginFactory& factory);
+
+    /// What `material` has in its first slot of the kind `type`, an aiTextureType. A picture that
+    /// is not found, or can't be made a file of, is told of by a warning with the material's name.
+    TextureSlot read(const MaterialProperties& material, unsigned type);
+    /// The texture for a slot that has a file. `channels` is its `colorChannels`, `mesh` one that
+    /// it is used on.
+    base::ref<base::IPlugin> create(const TextureSlot& slot, scene::Enumeration channels,
+                                    const aiMesh& mesh);
+
+    /// Uses of textures with a transform or projection that textures here have not.
+    base::u64 placedCount() const { return placedCount_; }
+    /// The pictures that files were made of.
+    const base::ref<PictureFolder>& pictures() const { return pictures_; }
+
+private:
+    using Key = std::tuple<base::string, scene::Enumeration, scene::Enumeration, base::string,
+                           scene::Enumeration>;
+
+    base::string findFile(const base::string& path, base::string_view material);
+    base::string searchFile(const base::string& path, base::string_view material);
+    template <class Make>
+    base::string makeFile(const base::string& path, base::string_view material,
+                          const base::string& otherwise, const Make& make);
+    base::string readableFile(const base::string& file, base::string_view material);
+
+    const aiScene& source_;
+    base::PluginFactory& factory_;
+    TextureSearch search_;
+    base::ref<PictureFolder> pictures_ = base::makeRef<PictureFolder>();
+    base::map<base::string, base::string> files_; ///< found ones by the path in the model
+    base::map<Key, base::ref<base::IPlugin>> textures_;
+    base::u64 placedCount_ = 0;
+};
+
+} // namespace assimp
