@@ -18,10 +18,10 @@ using base::u64;
 using base::u8;
 using base::vector;
 
-base::ref<iio::Image> makePhotograph(u32 width, u32 height, u8 format) {
+base::ref<iio::Image> makePhotograph(u32 width, u32 height, u8 format, u32 seed) {
     auto image =
         base::makeRef<iio::Image>(width, height, 1u, 1u, format, u8(iio::Image::IT_UNSIGNED_BYTE));
-    std::mt19937 random(1);
+    std::mt19937 random(seed);
     const u32 channels = image->channelCount();
     for (u32 y = 0; y < height; ++y) {
         u8* pixel = image->row(y);
@@ -94,7 +94,7 @@ vector<u8> decodeJpeg(const vector<u8>& file) {
     return pixels;
 }
 
-vector<u8> encodeJpeg(const iio::Image& image, int quality) {
+vector<u8> encodeJpeg(const u8* pixels, u32 width, u32 height, int quality) {
     jpeg_compress_struct jpeg;
     jpeg_error_mgr errors;
     jpeg.err = jpeg_std_error(&errors);
@@ -102,15 +102,15 @@ vector<u8> encodeJpeg(const iio::Image& image, int quality) {
     unsigned char* bytes = nullptr;
     unsigned long byteCount = 0;
     jpeg_mem_dest(&jpeg, &bytes, &byteCount);
-    jpeg.image_width = image.width();
-    jpeg.image_height = image.height();
+    jpeg.image_width = width;
+    jpeg.image_height = height;
     jpeg.input_components = 3;
     jpeg.in_color_space = JCS_RGB;
     jpeg_set_defaults(&jpeg);
     jpeg_set_quality(&jpeg, quality, TRUE);
     jpeg_start_compress(&jpeg, TRUE);
     while (jpeg.next_scanline < jpeg.image_height) {
-        auto* row = const_cast<u8*>(image.row(jpeg.next_scanline));
+        auto* row = const_cast<u8*>(pixels + u64(width) * 3 * jpeg.next_scanline);
         jpeg_write_scanlines(&jpeg, &row, 1);
     }
     jpeg_finish_compress(&jpeg);
@@ -120,7 +120,7 @@ vector<u8> encodeJpeg(const iio::Image& image, int quality) {
     return file;
 }
 
-void halveBare(const iio::Image& source, iio::Image& target) {
+void halveBare(const u8* source, u32 width, u32 height, u8* target) {
     constexpr u32 tapCount = 8;
     const base::KaiserFilter filter(1.5f);
     float weights[tapCount], sum = 0;
@@ -131,15 +131,15 @@ void halveBare(const iio::Image& source, iio::Image& target) {
     for (float& weight : weights)
         weight /= sum;
 
-    const u64 sourceCount = u64(source.width()) * 3, targetCount = u64(target.width()) * 3;
-    vector<float> row(sourceCount), between(targetCount * source.height()), sums(targetCount);
-    for (u32 y = 0; y < source.height(); ++y) {
-        const u8* bytes = source.row(y);
+    const u64 sourceCount = u64(width) * 3, targetCount = u64(width / 2) * 3;
+    vector<float> row(sourceCount), between(targetCount * height), sums(targetCount);
+    for (u32 y = 0; y < height; ++y) {
+        const u8* bytes = source + sourceCount * y;
         for (u64 k = 0; k < sourceCount; ++k)
             row[k] = static_cast<float>(bytes[k]) * (1.0f / 255);
         float* out = between.data() + targetCount * y;
-        for (u32 x = 0; x < target.width(); ++x, out += 3) {
-            const u32 first = std::clamp(2 * x, 3u, source.width() - tapCount + 3) - 3;
+        for (u32 x = 0; x < width / 2; ++x, out += 3) {
+            const u32 first = std::clamp(2 * x, 3u, width - tapCount + 3) - 3;
             const float* taps = row.data() + u64(first) * 3;
             float red = 0, green = 0, blue = 0;
             for (u32 t = 0; t < tapCount; ++t) {
@@ -152,8 +152,8 @@ void halveBare(const iio::Image& source, iio::Image& target) {
             out[2] = blue;
         }
     }
-    for (u32 y = 0; y < target.height(); ++y) {
-        const u32 first = std::clamp(2 * y, 3u, source.height() - tapCount + 3) - 3;
+    for (u32 y = 0; y < height / 2; ++y) {
+        const u32 first = std::clamp(2 * y, 3u, height - tapCount + 3) - 3;
         std::fill(sums.begin(), sums.end(), 0.0f);
         float* sumsOfRow = sums.data();
         for (u32 t = 0; t < tapCount; ++t) {
@@ -161,7 +161,7 @@ void halveBare(const iio::Image& source, iio::Image& target) {
             for (u64 k = 0; k < targetCount; ++k)
                 sumsOfRow[k] += weights[t] * taps[k];
         }
-        u8* bytes = target.row(y);
+        u8* bytes = target + targetCount * y;
         for (u64 k = 0; k < targetCount; ++k)
             bytes[k] = static_cast<u8>(static_cast<int>(std::max(sumsOfRow[k], 0.0f) * 255));
     }

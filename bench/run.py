@@ -93,6 +93,18 @@ ROWS = [
         "bench_picture", "picture/convert-type", times_floor),
     Row("picture/normal-map", "4096 x 4096 heights", "ns a pixel", 16.7, 16.7,
         "bench_picture", "picture/normal-map", nanoseconds_an_item),
+    Row("texture/jpeg", "16 colour maps of 2048 to JPEG", "x libraries", 1.15, 1.06,
+        "bench_texture", "texture/jpeg", times_floor),
+    Row("texture/pack", "16 grey pairs of 2048 packed", "x libraries", 1.35, 1.15,
+        "bench_texture", "texture/pack", times_floor),
+    Row("texture/pack-unequal", "16 of 2048 with 1024 packed", "x libraries", 2.6, 1.8,
+        "bench_texture", "texture/pack-unequal", times_floor),
+    Row("texture/halved", "16 colour maps of 2048 to 1024", "x libraries", 1.5, 1.15,
+        "bench_texture", "texture/halved", times_floor),
+    Row("texture/all", "16 materials with three maps", "x libraries", 1.25, 1.12,
+        "bench_texture", "texture/all", times_floor),
+    Row("texture/memory", "the same, peak", "MiB", 140, 115,
+        "bench_texture", "texture/memory", mebibytes, runs=1),
     Row("host/time", "program, 32 triangles, PLY", "ms", 30, 10,
         "bench_host", "host/ply", milliseconds),
     Row("host/memory", "program, 32 triangles, PLY, peak", "MiB", 24, 16,
@@ -145,14 +157,14 @@ def main():
 
     load = ", ".join(f"{value:.1f}" for value in os.getloadavg())
     print(f"load {load} on {os.cpu_count()} processors\n")
-    print(f"{'row':17} {'work':33} {'value':>7} {'least':>7} {'most':>7} {'unit':17} {'runs':>4} "
+    print(f"{'row':21} {'work':33} {'value':>7} {'least':>7} {'most':>7} {'unit':17} {'runs':>4} "
           f"{'must':>5} {'goal':>5}  reached")
     for row in ROWS:
         if not re.search(options.rows, row.name) or (options.quick and row.is_slow):
             continue
         count = min(row.runs or options.runs, 3 if options.quick else options.runs)
         value, least, most = summary(row, run_row(row, options.bin, count))
-        print(f"{row.name:17} {row.work:33} {value:7.2f} {least:7.2f} {most:7.2f} {row.unit:17} "
+        print(f"{row.name:21} {row.work:33} {value:7.2f} {least:7.2f} {most:7.2f} {row.unit:17} "
               f"{count:4} {row.must:5} {row.goal:5}  {verdict(row, value)}", flush=True)
 
 

@@ -77,13 +77,13 @@ std::span<const T> spanOf(const base::AttribMap& map, const Schema& name) {
     return {array->data(), array->size()};
 }
 
+} // namespace
+
 ScenePtr makeScene() {
     auto scene = std::make_unique<SceneBuilder>();
     gltf::registerPlugin(*scene->factory);
     return scene;
 }
-
-} // namespace
 
 ScenePtr makeLargeMesh() {
     ScenePtr scene = makeScene();
@@ -132,11 +132,15 @@ std::size_t byteCountOf(const base::vector<MeshArrays>& meshes) {
     return count;
 }
 
+void exportScene(SceneBuilder& scene, const std::string& path, const base::AttribMap& settings) {
+    if (!scene.factory->save(*scene.factory, base::string(path), settings))
+        throw std::runtime_error("the scene was not exported");
+}
+
 void exportScene(SceneBuilder& scene, const std::string& path, bool compress) {
     base::AttribMap settings;
     settings.attribute<bool>(scene::sceneExporter_schema::n_exportCompress) = compress;
-    if (!scene.factory->save(*scene.factory, base::string(path), settings))
-        throw std::runtime_error("the scene was not exported");
+    exportScene(scene, path, settings);
 }
 
 } // namespace bench

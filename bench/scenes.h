@@ -11,6 +11,9 @@ namespace bench {
 
 using ScenePtr = std::unique_ptr<test_support::SceneBuilder>;
 
+/// A scene with nothing in it that can be exported.
+ScenePtr makeScene();
+
 /// One node with a wavy grid of 8 million triangles: 4 million vertices with normals and one set
 /// of texture coordinates. Takes no more memory on the way than the scene has in the end.
 ScenePtr makeLargeMesh();
@@ -31,6 +34,8 @@ base::vector<MeshArrays> findArrays(const test_support::SceneBuilder& scene);
 std::size_t byteCountOf(const base::vector<MeshArrays>& meshes);
 
 /// The export as a host calls it. Throws if it fails.
+void exportScene(test_support::SceneBuilder& scene, const std::string& path,
+                 const base::AttribMap& settings);
 void exportScene(test_support::SceneBuilder& scene, const std::string& path, bool compress);
 
 } // namespace bench

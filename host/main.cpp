@@ -15,7 +15,7 @@ namespace {
 
 void loadPlugins(scene::SceneFactory& factory, const base::string& folder) {
     if (!folder.empty())
-        checkPluginFolder(folder);
+        checkFolder(folder, "plugins");
     factory.loadPlugins(folder);
 }
 
@@ -46,6 +46,8 @@ ExitCode runLogged(const CommandLine& line, Messages& messages, StageClock clock
     }
     parseOptions(line, registered);
     checkFilesDiffer(line, findSideFile(line, registered));
+    for (const base::string& folder : line.host.resourceFolders)
+        checkFolder(folder, "pictures");
     messages.openLogFile();
     return Run(*factory, line, registered, messages, std::move(clock)).execute();
 }

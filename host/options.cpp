@@ -9,6 +9,7 @@
 
 #include <algorithm>
 #include <numeric>
+#include <variant>
 
 namespace host {
 
@@ -21,37 +22,39 @@ using base::vector;
 
 namespace {
 
-/// An option of the program: a switch that is counted, or a text.
+/// An option of the program: a switch that is counted, a text, or a list with one text for each
+/// time that it is given.
 struct HostOption {
     string_view name;
     string_view value; ///< what the value is called in the help; empty for a switch
-    u32 HostOptions::*count;
-    string HostOptions::*text;
+    std::variant<u32 HostOptions::*, string HostOptions::*, vector<string> HostOptions::*> target;
     string_view help;
 };
 
 constexpr HostOption hostOptions[] = {
-    {"--help", "", &HostOptions::help, nullptr, "Prints this text."},
-    {"--version", "", &HostOptions::version, nullptr,
+    {"--help", "", &HostOptions::help, "Prints this text."},
+    {"--version", "", &HostOptions::version,
      "Prints the versions of the program, of the plugins and of the libraries they run on."},
-    {"--formats", "", &HostOptions::formats, nullptr,
+    {"--formats", "", &HostOptions::formats,
      "Prints the file extensions that can be read and written."},
-    {"--dry-run", "", &HostOptions::dryRun, nullptr,
+    {"--dry-run", "", &HostOptions::dryRun,
      "Reads INPUT, checks its meshes and tells what would be written, but writes nothing."},
-    {"--strict", "", &HostOptions::strict, nullptr,
+    {"--strict", "", &HostOptions::strict,
      "Ends with exit code 5 if there was any warning or error. The files are written all the "
      "same."},
-    {"--quiet", "", &HostOptions::quiet, nullptr,
+    {"--quiet", "", &HostOptions::quiet,
      "Prints errors alone: no warnings, no progress, no summary."},
-    {"--verbose", "", &HostOptions::verbose, nullptr,
+    {"--verbose", "", &HostOptions::verbose,
      "Prints information too; given twice, also what helps to find faults in the program."},
-    {"--log", "FILE", nullptr, &HostOptions::logFile,
+    {"--log", "FILE", &HostOptions::logFile,
      "Writes all messages to FILE, as HTML if its name ends with .html."},
-    {"--report", "FILE", nullptr, &HostOptions::reportFile,
-     "Writes a JSON report to FILE: options, counts, sizes, times, messages, and what the scene "
-     "holds that was not exported."},
-    {"--plugins", "DIR", nullptr, &HostOptions::pluginFolder,
+    {"--report", "FILE", &HostOptions::reportFile,
+     "Writes a JSON report to FILE: options, counts, sizes, pictures, times, messages, and what "
+     "the scene holds that was not exported."},
+    {"--plugins", "DIR", &HostOptions::pluginFolder,
      "Loads the plugins from DIR in place of the program's folder."},
+    {"--resources", "DIR", &HostOptions::resourceFolders,
+     "Looks for picture files in DIR as well; given several times, in that order."},
 };
 
 const HostOption* findHostOption(string_view name) {
@@ -60,14 +63,18 @@ const HostOption* findHostOption(string_view name) {
 }
 
 void setHostOption(HostOptions& options, const HostOption& option, const char* value) {
-    if (option.count) {
-        ++(options.*option.count);
+    if (const auto* count = std::get_if<u32 HostOptions::*>(&option.target)) {
+        ++(options.**count);
         return;
     }
     if (!value || !*value)
         throw Failure(ExitCode::usage, base::format("option '{}': expected {} behind it.",
                                                     option.name, option.value));
-    string& text = options.*option.text;
+    if (const auto* list = std::get_if<vector<string> HostOptions::*>(&option.target)) {
+        (options.**list).push_back(value);
+        return;
+    }
+    string& text = options.*std::get<string HostOptions::*>(option.target);
     if (!text.empty())
         throw Failure(ExitCode::usage, base::format("option '{}' given twice.", option.name));
     text = value;
@@ -185,7 +192,7 @@ CommandLine readCommandLine(std::span<const char* const> arguments) {
             filesOnly = true;
         } else if (const HostOption* option = findHostOption(argument)) {
             setHostOption(line.host, *option, next);
-            i += option->text ? 1 : 0;
+            i += option->value.empty() ? 0 : 1;
         } else {
             GivenOption given{string(argument), {}};
             if (next && !argument.starts_with("--")) {

@@ -20,6 +20,7 @@ struct HostOptions {
     base::string logFile; ///< these three are empty for none
     base::string pluginFolder;
     base::string reportFile;
+    base::vector<base::string> resourceFolders; ///< in the order in which they are searched
 };
 
 struct GivenOption {

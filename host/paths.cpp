@@ -89,13 +89,14 @@ void checkOutput(const string& path) {
                       base::format("{}: its folder does not exist, expected one that does.", path));
 }
 
-void checkPluginFolder(const string& path) {
+void checkFolder(const string& path, const char* content) {
     std::error_code error;
     const stdfs::file_status status = stdfs::status(systemPath(path), error);
     if (!stdfs::is_directory(status))
         throw Failure(ExitCode::usage,
-                      base::format("{}: {}, expected a folder with plugins.", path,
-                                   stdfs::exists(status) ? "is no folder" : "does not exist"));
+                      base::format("{}: {}, expected a folder with {}.", path,
+                                   stdfs::exists(status) ? "is no folder" : "does not exist",
+                                   content));
 }
 
 } // namespace host

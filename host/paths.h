@@ -28,7 +28,7 @@ void checkInput(const base::string& path);
 /// Throws `Failure` unless `path` could be a file: its folder is there and it is none itself.
 void checkOutput(const base::string& path);
 
-/// Throws `Failure` unless `path` is a folder.
-void checkPluginFolder(const base::string& path);
+/// Throws `Failure` unless `path` is a folder; `content` is what it should hold.
+void checkFolder(const base::string& path, const char* content);
 
 } // namespace host

@@ -29,6 +29,13 @@ void writeText(Writer& writer, string_view text) {
     writer.String(valid.data(), static_cast<rapidjson::SizeType>(valid.size()));
 }
 
+void writeTexts(Writer& writer, const base::vector<string>& texts) {
+    writer.StartArray();
+    for (const string& text : texts)
+        writeText(writer, text);
+    writer.EndArray();
+}
+
 void writeMember(Writer& writer, const char* name, string_view value) {
     writer.Key(name);
     writeText(writer, value);
@@ -68,6 +75,8 @@ void writeSetting(Writer& writer, const base::Attribute& value, const base::CmdL
         char text[32];
         const auto end = std::to_chars(text, std::end(text), *static_cast<const float*>(data)).ptr;
         writer.RawValue(text, static_cast<std::size_t>(end - text), rapidjson::kNumberType);
+    } else if (type == base::TypeTraits<string>::n_array_name) {
+        writeTexts(writer, *static_cast<const base::vector<string>*>(data));
     } else {
         writeText(writer, value.toString());
     }
@@ -118,6 +127,49 @@ void writeWritten(Writer& writer, const Output& written) {
     writeMember(writer, "geometry", counts.geometryBytes);
     writeMember(writer, "images", counts.imageBytes);
     writer.EndObject();
+}
+
+string_view wordFor(scene::ImageRecord::Work work) {
+    using Work = scene::ImageRecord::Work;
+    switch (work) {
+    case Work::kept:
+        return "kept";
+    case Work::converted:
+        return "converted";
+    case Work::resized:
+        return "resized";
+    case Work::packed:
+        return "packed";
+    case Work::normalMap:
+        return "made from a bump map";
+    }
+    return "unknown"; // of an exporter that knows more
+}
+
+/// A side of a picture, null if it is not known.
+void writeSide(Writer& writer, const char* name, base::i32 pixels) {
+    writer.Key(name);
+    if (pixels < 0)
+        writer.Null();
+    else
+        writer.Int(pixels);
+}
+
+void writeImages(Writer& writer, const base::vector<scene::ImageRecord>& images) {
+    writer.Key("images");
+    writer.StartArray();
+    for (const scene::ImageRecord& image : images) {
+        writer.StartObject();
+        writeMember(writer, "name", image.name);
+        writer.Key("sources");
+        writeTexts(writer, image.sources);
+        writeMember(writer, "work", wordFor(image.work));
+        writeSide(writer, "width", image.width);
+        writeSide(writer, "height", image.height);
+        writeMember(writer, "bytes", u64(image.byteLength));
+        writer.EndObject();
+    }
+    writer.EndArray();
 }
 
 void writeScene(Writer& writer, const SceneCounts& counts) {
@@ -192,10 +244,12 @@ string reportText(const RunRecord& record, const base::vector<Message>& messages
     writeSettings(writer, "exporter", record.settings.exporter, registered);
     writer.EndObject();
 
-    if (record.isDryRun)
+    if (record.isDryRun) {
         writeScene(writer, record.scene);
-    else
+    } else {
         writeWritten(writer, record.written);
+        writeImages(writer, record.images);
+    }
     writeSeconds(writer, record.clock);
     writeMessages(writer, messages);
     writeUnexported(writer, record.unexported);

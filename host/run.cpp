@@ -7,6 +7,7 @@
 #include "host/summary.h"
 
 #include "b_string_convert.h"
+#include "scene_options.h"
 #include "scene_schema.h"
 #include "stream/b_fs.h"
 
@@ -38,6 +39,16 @@ void attempt(ExitCode code, const string& path, const string& expected, const Wo
     }
     reason.resize(reason.find_last_not_of(".! \n") + 1); // the sentence goes on
     throw Failure(code, base::format("{}: {}, expected {}.", path, reason, expected));
+}
+
+/// Tells the folders in which pictures are looked for.
+void storeResourceFolders(const base::vector<string>& folders, AttribMap& settings) {
+    if (folders.empty())
+        return;
+    auto& paths = write(settings, scene::sceneExporter_schema::n_resourcePaths);
+    // With the separator: plugins put the name of a file right behind.
+    for (const string& folder : folders)
+        paths.push_back(base::fs::joined(folder, ""));
 }
 
 /// Tells how far the run is, for the bar.
@@ -116,7 +127,7 @@ void Run::doStages() {
     record_.clock.begin("report");
     if (!record_.isDryRun)
         attempt(ExitCode::output, record_.output, "a whole file that can be read back",
-                [&] { record_.written = readOutput(record_.output); });
+                [&] { readBack(); });
 }
 
 /// Finds the importer and its settings.
@@ -127,6 +138,7 @@ void Run::prepareImport() {
         throw base::exception("no plugin reads files of this kind");
     base::vector<string> errors;
     scene::applyOptions(registered_, "importer", settings, errors);
+    storeResourceFolders(options_.resourceFolders, settings);
 }
 
 /// Finds the exporter and its settings.
@@ -136,6 +148,7 @@ void Run::prepareExport() {
         throw base::exception("no plugin writes files of this kind");
     base::vector<string> errors;
     scene::applyOptions(registered_, "exporter", settings, errors);
+    storeResourceFolders(options_.resourceFolders, settings);
 }
 
 void Run::importScene() {
@@ -167,6 +180,13 @@ void Run::exportScene() {
         throw Failure(ExitCode::output,
                       record_.output + ": not all files could be written, expected room and leave "
                                        "to write them. The messages above tell which.");
+}
+
+void Run::readBack() {
+    const base::ref<base::IPlugin> scene = factory_.firstOfType(scene::scene_schema::n_kind);
+    if (scene)
+        record_.images = scene::findImageRecords(*scene);
+    record_.written = readOutput(record_.output);
 }
 
 /// The exit code with what the log received taken into account.

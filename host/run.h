@@ -26,6 +26,7 @@ private:
     void importScene();
     void applySceneOptions();
     void exportScene();
+    void readBack();
     ExitCode judged(ExitCode failure) const;
     void writeReport();
     void printSummary() const;

@@ -5,7 +5,7 @@
 #include "host/scene_contents.h"
 #include "host/stage_clock.h"
 
-#include "b_attribute_map.h"
+#include "scene_image_record.h"
 
 namespace host {
 
@@ -23,7 +23,8 @@ struct RunRecord {
     bool isDryRun = false;
     ExitCode exitCode = ExitCode::done;
     Settings settings;
-    Output written;    ///< without files also if the run ended before
+    Output written; ///< without files also if the run ended before
+    base::vector<scene::ImageRecord> images;
     SceneCounts scene; ///< of a dry run
     base::vector<ObjectName> unexported;
     StageClock clock;

@@ -50,6 +50,10 @@ TEST_F(CommandLineTest, WrongOnesAreRefusedByName) {
         {{"@/a.script", "@/a.out", "-exportCompress"}, "wrong number of values."},
         {{"@/a.script", "@/a.out", "--log"}, "option '--log': expected FILE"},
         {{"--log", "@/l", "--log", "@/m", "@/a.script", "@/a.out"}, "'--log' given twice"},
+        {{"@/a.script", "@/a.out", "--resources", ""}, "option '--resources': expected DIR"},
+        {{"--resources", "@", "--resources", "@/x", "@/a.script", "@/a.out"},
+         "@/x: does not exist, expected a folder with pictures."},
+        {{"--resources", "@/a.out", "@/a.script", "@/a.out"}, "@/a.out: is no folder"},
         {{"--quiet", "--verbose", "@/a.script", "@/a.out"}, "exclude each other"},
         {{"@/a.script", "@/a.script"}, "INPUT and OUTPUT are the same file"},
         {{"@/a.script", "@/link.out"}, "INPUT and OUTPUT are the same file"},
@@ -64,7 +68,7 @@ TEST_F(CommandLineTest, WrongOnesAreRefusedByName) {
     for (const auto& row : rows) {
         const Outcome outcome = run(row.arguments);
         EXPECT_EQ(outcome.exitCode, 1) << row.error;
-        EXPECT_NE(outcome.err.find(row.error), std::string::npos) << outcome.err;
+        EXPECT_NE(outcome.err.find(path(row.error)), std::string::npos) << outcome.err;
         EXPECT_TRUE(outcome.err.starts_with("scene_export: error: ")) << outcome.err;
         EXPECT_EQ(outcome.out, "") << row.error;
     }
@@ -139,11 +143,13 @@ TEST_F(CommandLineTest, MessagesGoWhereTheyAreWanted) {
 }
 
 TEST_F(CommandLineTest, LogFilesTakeAllMessages) {
-    const std::string script = "log 2 <bad>\nlog 4 told\nlog 5 deep\n---\nx";
+    const std::string script = "log 2 <bad>\nlog 4 told\nlog 5 deep\n"
+                               "log 2 Unable to delete temporary file!\n---\nx";
     EXPECT_EQ(runScript(script, {"--quiet", "--log", "@/run.txt"}).exitCode, 0);
     const std::string text = readFile(path("@/run.txt"));
     EXPECT_NE(text.find("[erro] <bad>\n"), std::string::npos) << text;
     EXPECT_NE(text.find("[info] told\n"), std::string::npos) << text;
+    EXPECT_NE(text.find("temporary file!\n"), std::string::npos) << text;
     EXPECT_EQ(text.find("deep"), std::string::npos) << text;
 
     EXPECT_EQ(runScript(script, {"--verbose", "--verbose", "--log", "@/run.html"}).exitCode, 0);

@@ -58,6 +58,47 @@ TEST_F(ReportTest, TellsOptionsMessagesAndWhatWasLeftOut) {
     EXPECT_LE(sum, document["seconds"]["total"].GetDouble());
 }
 
+TEST_F(ReportTest, TellsWhatBecameOfPictures) {
+    const std::string script = "image 0 4 2 31 a.png /p/a.png\nimage 1 -1 -1 0 b.jpg b.tga\n"
+                               "image 2 1 1 9 c\\\"\xff.jpg /p/c.png\nimage 3 8 8 2 d.jpg m r o\n"
+                               "image 4 8 8 2 e.jpg h\nimage 9 8 8 -1 f.jpg\n---\n{}";
+    const std::vector<std::string> options = {"--report", "@/report.json"};
+    EXPECT_EQ(runScript(script, options).exitCode, 0);
+    expectJson(report()["images"], R"([
+        {"name": "a.png", "sources": ["/p/a.png"], "work": "kept",
+         "width": 4, "height": 2, "bytes": 31},
+        {"name": "b.jpg", "sources": ["b.tga"], "work": "converted",
+         "width": null, "height": null, "bytes": 0},
+        {"name": "c\\\"\uFFFD.jpg", "sources": ["/p/c.png"], "work": "resized",
+         "width": 1, "height": 1, "bytes": 9},
+        {"name": "d.jpg", "sources": ["m", "r", "o"], "work": "packed",
+         "width": 8, "height": 8, "bytes": 2},
+        {"name": "e.jpg", "sources": ["h"], "work": "made from a bump map",
+         "width": 8, "height": 8, "bytes": 2},
+        {"name": "f.jpg", "sources": [], "work": "unknown",
+         "width": 8, "height": 8, "bytes": 4294967295}])");
+    EXPECT_EQ(runScript("---\n{}", options).exitCode, 0);
+    expectJson(report()["images"], "[]");
+    EXPECT_EQ(runScript(script, {"--report", "@/report.json", "--dry-run"}).exitCode, 0);
+    EXPECT_FALSE(report().HasMember("images"));
+}
+
+TEST_F(ReportTest, TellsTheResourceFolders) {
+    for (const char* folder : {"@/a", "@/b"})
+        std::filesystem::create_directory(path(folder));
+    EXPECT_EQ(runScript("---\nx", {"--resources", "@/b/", "--resources", "file://@/a",
+                                   "--resources", ".", "--report", "@/report.json"})
+                  .exitCode,
+              0);
+    const rapidjson::Document document = report();
+    // Each with the separator behind it, as plugins need them.
+    const std::string expected = path("[\"@/b/\", \"file://@/a/\", \"./\"]");
+    for (const char* group : {"importer", "exporter"})
+        expectJson(document["options"][group]["resourcePaths"], expected.c_str());
+    EXPECT_EQ(runScript("---\nx", {"--report", "@/report.json"}).exitCode, 0);
+    EXPECT_FALSE(report()["options"]["exporter"].HasMember("resourcePaths"));
+}
+
 TEST_F(ReportTest, IsWrittenForFailuresToo) {
     EXPECT_EQ(runScript("import throw-text", {"--report", "@/report.json"}).exitCode, 2);
     const rapidjson::Document document = report();

@@ -2,6 +2,7 @@
 // follows the line "---" is the text that the exporter writes.
 #include "scene.h"
 #include "scene_factory.h"
+#include "scene_image_record.h"
 
 #include "b_cmdline.h"
 #include "b_exception.h"
@@ -66,6 +67,23 @@ void addMesh(base::PluginFactory& scene, base::u32 secondCorner, base::AttribMap
     write(root, scene::node_schema::n_children).push_back(mesh);
 }
 
+/// Records an exported picture: "work width height bytes name source...".
+void addImage(base::PluginFactory& scene, const string& argument) {
+    const base::vector<string_view> words = base::split(argument, ' ');
+    const auto number = [&](std::size_t i) { return std::atoi(string(words[i]).c_str()); };
+    const base::ref<base::IPlugin> document = scene.firstOfType(scene::scene_schema::n_kind);
+    base::vector<scene::ImageRecord> records = scene::findImageRecords(*document);
+    scene::ImageRecord& record = records.emplace_back();
+    record.work = static_cast<scene::ImageRecord::Work>(number(0));
+    record.width = number(1);
+    record.height = number(2);
+    record.byteLength = static_cast<base::u32>(number(3));
+    record.name = string(words[4]);
+    for (std::size_t i = 5; i < words.size(); ++i)
+        record.sources.push_back(string(words[i]));
+    scene::storeImageRecords(*document, records);
+}
+
 class Importer final : public scene::SceneImportPlugin {
 public:
     using SceneImportPlugin::SceneImportPlugin;
@@ -103,6 +121,8 @@ private:
             write(*scene.create(nameOf(argument)), scene::node_schema::n_name) = "The " + argument;
         else if (command == "mesh")
             addMesh(scene, argument == "broken" ? 9 : 1, root);
+        else if (command == "image")
+            addImage(scene, argument);
         return command != "refuse";
     }
 };
