@@ -201,7 +201,7 @@ private:
     base::vector<string> filesOf(std::initializer_list<const ITexture*> textures) const {
         base::vector<string> files;
         for (const ITexture* texture : textures) {
-            string path = texture ? exporter_.resolveTexturePath(*texture) : string();
+            string path = texture ? exporter_.sourceOf(*texture) : string();
             if (!path.empty() && std::ranges::find(files, path) == files.end())
                 files.push_back(std::move(path));
         }

@@ -117,9 +117,8 @@ ref<GLTF::Texture> GLTFScenePlugin::buildTexture(const scene::ITexture& texture,
     }
     if (texture.typeName() != fileTexture_schema::n_kind)
         return nullptr;
-    ref<GLTF::Image> image = overridePath.empty()
-                                 ? buildImage(resolveTexturePath(texture), hasAlpha)
-                                 : takeImage(overridePath);
+    ref<GLTF::Image> image =
+        overridePath.empty() ? buildImage(texture, hasAlpha) : takeImage(overridePath);
     if (!image)
         return nullptr;
     auto gltfTexture = base::makeRef<GLTF::Texture>();
@@ -130,9 +129,10 @@ ref<GLTF::Texture> GLTFScenePlugin::buildTexture(const scene::ITexture& texture,
     return gltfTexture;
 }
 
-/// The image of the file at `path`, read and written again where that is asked for. Null for no
-/// path. Files are prepared once, whatever the number of textures that show them.
-ref<GLTF::Image> GLTFScenePlugin::buildImage(const string& path, bool* hasAlpha) {
+/// The image of the texture's file, read and written again where that is asked for. Null without
+/// a file. Files are prepared once, whatever the number of textures that show them.
+ref<GLTF::Image> GLTFScenePlugin::buildImage(const scene::ITexture& texture, bool* hasAlpha) {
+    const string path = resolveTexturePath(texture);
     if (path.empty())
         return nullptr;
     const auto [entry, isNew] = preparedImages_.try_emplace(path);
@@ -153,7 +153,7 @@ ref<GLTF::Image> GLTFScenePlugin::buildImage(const string& path, bool* hasAlpha)
             prepared.image = GLTF::Image::load(path);
             prepared.image->uri = makeUri(path, path);
         }
-        describeImage(*prepared.image, {path},
+        describeImage(*prepared.image, {sourceOf(texture)},
                       !isMade        ? ImageRecord::Work::kept
                       : plan.resizes ? ImageRecord::Work::resized
                                      : ImageRecord::Work::converted);
@@ -169,6 +169,12 @@ ref<GLTF::Image> GLTFScenePlugin::takeImage(const string& path) {
     image->uri = makeUri(path, path);
     base::fs::master().remove(path);
     return image;
+}
+
+/// The file that the texture's picture comes from.
+string GLTFScenePlugin::sourceOf(const scene::ITexture& texture) const {
+    const string* source = scene::findPictureSource(texture);
+    return source ? *source : resolveTexturePath(texture);
 }
 
 void GLTFScenePlugin::describeImage(const GLTF::Image& image, base::vector<string> sources,

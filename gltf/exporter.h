@@ -138,7 +138,8 @@ private:
     GLTF::Material* getEdgeMaterial(const scene::ILines& lines);
 
     const base::string& temporaryFolder();
-    base::ref<GLTF::Image> buildImage(const base::string& path, bool* hasAlpha);
+    base::ref<GLTF::Image> buildImage(const scene::ITexture& texture, bool* hasAlpha);
+    base::string sourceOf(const scene::ITexture& texture) const;
     base::ref<GLTF::Image> takeImage(const base::string& path);
     bool isHeightMap(const scene::ITexture& map) const;
     base::string makeNormalMapFile(const scene::ITexture& map, const scene::IMaterial& material);

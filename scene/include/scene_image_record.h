@@ -30,4 +30,10 @@ SCENE_API void storeImageRecords(base::AttribMap& scene, const base::vector<Imag
 /// Those of the last export, empty without one.
 SCENE_API base::vector<ImageRecord> findImageRecords(const base::AttribMap& scene);
 
+/// Tells, by a transient attribute, that the file of `texture` was made from the one at `path`,
+/// such as a model that holds the picture.
+SCENE_API void setPictureSource(base::AttribMap& texture, const base::string& path);
+/// Null for a texture that shows a file as it is.
+SCENE_API const base::string* findPictureSource(const base::AttribMap& texture);
+
 } // namespace scene

@@ -17,11 +17,16 @@ struct Names {
     name_id width = base::nameServer().id("width");
     name_id height = base::nameServer().id("height");
     name_id byteLength = base::nameServer().id("byteLength");
+    name_id pictureSource = base::nameServer().id("pictureSource");
 };
 
 const Names& names() {
     static const Names interned;
     return interned;
+}
+
+void makeTransient(base::Attribute& attribute) {
+    attribute.setFlags(attribute.flags() | base::attribTransient);
 }
 
 template <class T>
@@ -36,7 +41,7 @@ void storeImageRecords(AttribMap& scene, const base::vector<ImageRecord>& record
     const Names& n = names();
     scene.removeAttribute(n.list);
     base::AttribArray& list = scene.arrayAttribute(n.list);
-    list.setFlags(list.flags() | base::attribTransient);
+    makeTransient(list);
     for (const ImageRecord& record : records) {
         auto* item = new AttribMap;
         list.append(item);
@@ -67,6 +72,16 @@ base::vector<ImageRecord> findImageRecords(const AttribMap& scene) {
         take(*item, n.byteLength, record.byteLength);
     }
     return records;
+}
+
+void setPictureSource(AttribMap& texture, const base::string& path) {
+    const name_id name = names().pictureSource;
+    texture.attribute<base::string>(name) = path;
+    makeTransient(*texture.findAttribute(name));
+}
+
+const base::string* findPictureSource(const AttribMap& texture) {
+    return texture.findAttribute<base::string>(names().pictureSource);
 }
 
 } // namespace scene
