@@ -7,9 +7,12 @@
 #include "b_exception.h"
 #include "b_string_convert.h"
 #include "stream/b_fs.h"
+#include "stream/b_stream_workers.h"
 
 #include <assimp/scene.h>
 
+#include <algorithm>
+#include <cstddef>
 #include <cstring>
 
 namespace assimp {
@@ -47,26 +50,32 @@ string extensionOf(const aiTexture& texture, std::span<const u8> bytes, const st
 
 string writeCompressed(const aiTexture& texture, const string& name, PictureFolder& folder) {
     const std::span bytes(reinterpret_cast<const u8*>(texture.pcData), texture.mWidth);
-    if (kindOf(bytes, fs::extension(name)) == PictureKind::convertible)
-        if (const Bytes png = convertToPng(bytes); !png.empty())
-            return folder.add(fs::stem(name), "png", {png.data(), png.size()});
-    return folder.add(fs::stem(name), extensionOf(texture, bytes, name), bytes);
+    const string extension = extensionOf(texture, bytes, name);
+    base::vector<u8> content(bytes.begin(), bytes.end());
+    base::Stream file = base::vectorStream(content, "texture." + extension);
+    if (const base::ref<iio::Image> readable = makeReadable(file))
+        return folder.add(fs::stem(name), *readable);
+    return folder.add(fs::stem(name), extension, bytes);
 }
 
-/// Texels that are not in a format of their own.
+/// Texels that are not in a format of their own. Of formats that know no alpha they come with one
+/// of 0 as well as of 255.
 string writeTexels(const aiTexture& texture, const string& name, PictureFolder& folder) {
     const u64 count = u64(texture.mWidth) * texture.mHeight;
     if (count > (u64(1) << 26))
         fail("It has more than 2^26 pixels.");
-    Bytes texels;
-    texels.reserve(count * 4);
-    for (const aiTexel& t : std::span(texture.pcData, count))
-        for (const u8 component : {t.r, t.g, t.b, t.a})
-            texels.push_back(component);
-    const Bytes png = encodePng({texels.cbegin(), texels.size()}, texture.mWidth, texture.mHeight);
-    if (png.empty())
-        fail("It can't be encoded.");
-    return folder.add(fs::stem(name), "png", {png.data(), png.size()});
+    auto image = base::makeRef<iio::Image>();
+    image->create(texture.mWidth, texture.mHeight, 1, 1, iio::Image::kBGRA,
+                  iio::Image::IT_UNSIGNED_BYTE);
+    if (!image->data())
+        fail("There is not enough memory.");
+    static_assert(sizeof(aiTexel) == 4 && offsetof(aiTexel, b) == 0 && offsetof(aiTexel, a) == 3);
+    std::memcpy(image->data(), texture.pcData, image->memorySize());
+    const std::span texels(texture.pcData, count);
+    const bool isPlain =
+        std::ranges::all_of(texels, [](const aiTexel& texel) { return texel.a == 0; });
+    image = isPlain ? image->convertFormat(iio::Image::kRGB) : withoutOpaqueAlpha(image);
+    return folder.add(fs::stem(name), *image);
 }
 
 } // namespace

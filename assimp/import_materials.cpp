@@ -351,9 +351,8 @@ bool isMadeUp(const aiMaterial& material) {
 
 /// - Modelling programs put a map in the place of a color. MTL multiplies them by definition, and
 ///   so do the formats of games and viewers.
-/// - COLLADA: writers took `<transparency>` for what it is called, though 1 means opaque there.
-/// MTL:
-///   "Tr" is written in both senses.
+/// - Writers of COLLADA took `<transparency>` for what it is called, though 1 means opaque there,
+///   and those of MTL write "Tr" in both senses.
 /// - COLLADA's opacity is in `<transparent>` alone.
 /// - The reader of MTL also says Gouraud of materials whose file names no model.
 MaterialFormat::MaterialFormat(string_view extension)

@@ -6,6 +6,7 @@
 
 #include "b_exception.h"
 #include "b_log.h"
+#include "scene_image_record.h"
 #include "stream/b_fs.h"
 
 #include <assimp/material.h>
@@ -56,28 +57,19 @@ string joinedList(const vector<string>& texts) {
     return list;
 }
 
-/// The first bytes of the file, at most `count`.
-Bytes readFile(const string& path, u64 count) {
-    base::Stream stream;
-    fs::master().open(stream, path, base::fs::openRead);
-    Bytes bytes;
-    bytes.resizeUninitialized(std::min(count, stream.size()));
-    bytes.resize(stream.read(bytes.data(), bytes.size()));
-    return bytes;
-}
-
 } // namespace
 
 TextureImport::TextureImport(const aiScene& source, const string& path,
                              vector<string> resourcePaths, base::PluginFactory& factory)
-    : source_(source), factory_(factory), search_(path, std::move(resourcePaths)) {}
+    : source_(source), factory_(factory), modelPath_(path),
+      search_(path, std::move(resourcePaths)) {}
 
 TextureSlot TextureImport::read(const MaterialProperties& material, unsigned type) {
     TextureSlot slot;
     slot.path = material.readText({AI_MATKEY_TEXTURE(type, 0)});
     if (slot.path.empty())
         return slot;
-    slot.file = findFile(slot.path, material.readText({AI_MATKEY_NAME}));
+    static_cast<PictureFile&>(slot) = findFile(slot.path, material.readText({AI_MATKEY_NAME}));
     slot.wrapU = readWrap(material, {AI_MATKEY_MAPPINGMODE_U(type, 0)});
     slot.wrapV = readWrap(material, {AI_MATKEY_MAPPINGMODE_V(type, 0)});
     slot.channel =
@@ -86,21 +78,22 @@ TextureSlot TextureImport::read(const MaterialProperties& material, unsigned typ
     return slot;
 }
 
-string TextureImport::findFile(const string& path, string_view material) {
+const PictureFile& TextureImport::findFile(const string& path, string_view material) {
     const auto [at, isNew] = files_.try_emplace(path);
     if (isNew)
         at->second = searchFile(path, material);
     return at->second;
 }
 
-string TextureImport::searchFile(const string& path, string_view material) {
+PictureFile TextureImport::searchFile(const string& path, string_view material) {
     if (const aiTexture* embedded = findEmbedded(source_, path))
-        return makeFile(path, material, {},
-                        [&] { return writeEmbedded(*embedded, path, *pictures_); });
+        return {makeFile(path, material, {},
+                         [&] { return writeEmbedded(*embedded, path, *pictures_); }),
+                modelPath_};
     vector<string> tried;
     const string file = search_.find(path, tried);
     if (!file.empty())
-        return readableFile(file, material);
+        return {readableFile(file, material), file};
     base::log().log(base::logScene, base::logWarning,
                     "assimp |{}| Unable to find the texture '{}', it is left out! Tried: {}",
                     material, path, joinedList(tried));
@@ -123,17 +116,13 @@ string TextureImport::makeFile(const string& path, string_view material, const s
     return otherwise;
 }
 
-/// The file, or a PNG of it if it is in a format that exporters can't read. They report what
-/// nobody can.
+/// The file, or a PNG of what exporters should read in its place.
 string TextureImport::readableFile(const string& file, string_view material) {
-    constexpr u64 headerLength = 18, longest = u64(1) << 29;
     return makeFile(file, material, file, [&] {
-        const Bytes start = readFile(file, headerLength);
-        if (kindOf({start.data(), start.size()}, fs::extension(file)) != PictureKind::convertible)
-            return file;
-        const Bytes bytes = readFile(file, longest);
-        const Bytes png = convertToPng({bytes.data(), bytes.size()});
-        return png.empty() ? file : pictures_->add(fs::stem(file), "png", {png.data(), png.size()});
+        base::Stream stream;
+        fs::master().open(stream, file, base::fs::openRead);
+        const base::ref<iio::Image> readable = makeReadable(stream);
+        return readable ? pictures_->add(fs::stem(file), *readable) : file;
     });
 }
 
@@ -148,6 +137,8 @@ base::ref<base::IPlugin> TextureImport::create(const TextureSlot& slot, Enumerat
     texture = factory_.create(Schema::n_kind);
     write(*texture, scene::texture_schema::n_name) = fs::stem(slot.file);
     write(*texture, Schema::n_file) = slot.file;
+    if (slot.source != slot.file)
+        scene::setPictureSource(*texture, slot.source);
     if (!set.empty())
         write(*texture, scene::texture_schema::n_uvSet) = set;
     if (slot.wrapU != wrapRepeat)

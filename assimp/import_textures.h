@@ -13,10 +13,15 @@ struct aiScene;
 
 namespace assimp {
 
+/// A picture that a model names.
+struct PictureFile {
+    base::string file;   ///< to be read by exporters; empty if the picture was not found
+    base::string source; ///< what it was made from: another file, or the model
+};
+
 /// The first texture of a kind at a material.
-struct TextureSlot {
-    base::string path; ///< as the file has it
-    base::string file; ///< where that is; empty if it was not found
+struct TextureSlot : PictureFile {
+    base::string path; ///< as the model has it
     scene::Enumeration wrapU = 0, wrapV = 0;
     base::u32 channel = 0; ///< which of the library's sets of coordinates
 
@@ -48,8 +53,8 @@ private:
     using Key = std::tuple<base::string, scene::Enumeration, scene::Enumeration, base::string,
                            scene::Enumeration>;
 
-    base::string findFile(const base::string& path, base::string_view material);
-    base::string searchFile(const base::string& path, base::string_view material);
+    const PictureFile& findFile(const base::string& path, base::string_view material);
+    PictureFile searchFile(const base::string& path, base::string_view material);
     template <class Make>
     base::string makeFile(const base::string& path, base::string_view material,
                           const base::string& otherwise, const Make& make);
@@ -57,9 +62,10 @@ private:
 
     const aiScene& source_;
     base::PluginFactory& factory_;
+    base::string modelPath_;
     TextureSearch search_;
     base::ref<PictureFolder> pictures_ = base::makeRef<PictureFolder>();
-    base::map<base::string, base::string> files_; ///< found ones by the path in the model
+    base::map<base::string, PictureFile> files_; ///< by the path in the model
     base::map<Key, base::ref<base::IPlugin>> textures_;
     base::u64 placedCount_ = 0;
 };

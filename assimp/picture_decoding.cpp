@@ -1,10 +1,13 @@
 #include "assimp/picture_decoding.h"
 
 #include "b_string_convert.h"
+#include "i_file.h"
+#include "stream/b_fs.h"
 
 #include <algorithm>
 #include <climits>
 #include <cstdlib>
+#include <cstring>
 #include <memory>
 
 #define STB_IMAGE_IMPLEMENTATION
@@ -16,10 +19,6 @@
 #define STBI_ONLY_TGA
 #define STBI_NO_STDIO
 #include <stb/stb_image.h>
-#define STB_IMAGE_WRITE_IMPLEMENTATION
-#define STB_IMAGE_WRITE_STATIC
-#define STBI_WRITE_NO_STDIO
-#include <stb/stb_image_write.h>
 
 namespace assimp {
 
@@ -27,6 +26,7 @@ using base::string_view;
 using base::u32;
 using base::u64;
 using base::u8;
+using iio::Image;
 
 namespace {
 
@@ -55,29 +55,21 @@ bool looksLikeTga(std::span<const u8> bytes) {
            (bytes[12] | bytes[13]) != 0 && (bytes[14] | bytes[15]) != 0;
 }
 
-/// Keeps of each pixel the channels but the last one.
-void dropLastChannel(u8* pixels, std::size_t pixelCount, std::size_t channels) {
-    for (std::size_t i = 1; i < pixelCount; ++i)
-        std::copy_n(pixels + i * channels, channels - 1, pixels + i * (channels - 1));
+/// True if the header of a PNG or TGA file tells of an alpha channel.
+bool hasAlphaChannel(std::span<const u8> start, PictureKind kind) {
+    constexpr std::size_t pngColorTypeAt = 25, tgaDepthAt = 16;
+    if (kind == PictureKind::png)
+        return start.size() > pngColorTypeAt && (start[pngColorTypeAt] & 4) != 0;
+    return kind == PictureKind::tga && start[tgaDepthAt] == 32;
 }
 
-/// `pixels` are changed if the alpha channel goes.
-Bytes encode(u8* pixels, u32 width, u32 height, std::size_t channels, bool dropsAlpha) {
-    const std::size_t pixelCount = std::size_t(width) * height;
-    if (dropsAlpha)
-        dropLastChannel(pixels, pixelCount, channels--);
-    int length = 0;
-    const Buffer png(
-        stbi_write_png_to_mem(pixels, 0, int(width), int(height), int(channels), &length));
-    return png ? Bytes(png.get(), png.get() + length) : Bytes();
-}
-
-/// True if the last of the channels has the value `alpha` everywhere.
-bool hasAlphaEverywhere(const u8* pixels, std::size_t pixelCount, std::size_t channels, u8 alpha) {
-    for (std::size_t i = 0; i < pixelCount; ++i)
-        if (pixels[i * channels + channels - 1] != alpha)
-            return false;
-    return true;
+/// The first bytes of the file, at most `count`, from which it is read again.
+base::vector<u8> readStart(base::Stream& file, u64 count) {
+    base::vector<u8> bytes;
+    bytes.resizeUninitialized(std::min(count, file.size()));
+    bytes.resize(file.read(bytes.data(), bytes.size()));
+    file.setPosition(0);
+    return bytes;
 }
 
 } // namespace
@@ -89,39 +81,51 @@ PictureKind kindOf(std::span<const u8> start, string_view extension) {
         return PictureKind::jpeg;
     for (const char* mark : {"BM", "GIF87a", "GIF89a", "8BPS", "P5", "P6"})
         if (startsWith(start, mark))
-            return PictureKind::convertible;
+            return PictureKind::foreign;
     if (!looksLikeTga(start))
         return PictureKind::unknown;
-    return base::toLower(extension) == "tga" ? PictureKind::tga : PictureKind::convertible;
+    return base::toLower(extension) == "tga" ? PictureKind::tga : PictureKind::foreign;
 }
 
-Bytes convertToPng(std::span<const u8> bytes) {
+base::ref<Image> decodePicture(std::span<const u8> bytes) {
     if (bytes.size() > INT_MAX)
-        return {};
+        return nullptr;
     const int length = static_cast<int>(bytes.size());
     int width = 0, height = 0, channels = 0;
     if (!stbi_info_from_memory(bytes.data(), length, &width, &height, &channels) || width <= 0 ||
         height <= 0 || u64(width) * u64(height) > mostPixels)
-        return {};
+        return nullptr;
     const Buffer pixels(stbi_load_from_memory(bytes.data(), length, &width, &height, &channels, 0));
     if (!pixels)
-        return {};
-    const auto channelCount = static_cast<std::size_t>(channels);
-    const bool isOpaque =
-        channelCount % 2 == 0 &&
-        hasAlphaEverywhere(pixels.get(), std::size_t(width) * height, channelCount, 255);
-    return encode(pixels.get(), u32(width), u32(height), channelCount, isOpaque);
+        return nullptr;
+    constexpr u8 formats[] = {Image::kLuminance, Image::kLuminanceAlpha, Image::kRGB, Image::kRGBA};
+    auto image = base::makeRef<Image>();
+    image->create(u32(width), u32(height), 1, 1, formats[channels - 1], Image::IT_UNSIGNED_BYTE);
+    if (!image->data())
+        return nullptr;
+    std::memcpy(image->data(), pixels.get(), image->memorySize());
+    return image;
 }
 
-/// Of formats that know no alpha, texels come with one of 0 as well as of 255.
-Bytes encodePng(std::span<const u8> texels, u32 width, u32 height) {
-    const u64 pixelCount = u64(width) * height;
-    if (pixelCount == 0 || pixelCount > mostPixels || texels.size() < pixelCount * 4)
-        return {};
-    Bytes pixels(texels.begin(), texels.begin() + static_cast<std::ptrdiff_t>(pixelCount) * 4);
-    const bool isPlain = hasAlphaEverywhere(pixels.data(), pixelCount, 4, 0) ||
-                         hasAlphaEverywhere(pixels.data(), pixelCount, 4, 255);
-    return encode(pixels.data(), width, height, 4, isPlain);
+base::ref<Image> withoutOpaqueAlpha(base::ref<Image> image) {
+    if (!image || !image->hasAlpha() || image->checkTransparency())
+        return image;
+    return image->convertFormat(image->channelCount() == 2 ? Image::kLuminance : Image::kRGB);
+}
+
+base::ref<Image> makeReadable(base::Stream& file) {
+    constexpr u64 headerLength = 26, longest = u64(1) << 29;
+    const base::vector<u8> start = readStart(file, headerLength);
+    const std::span startBytes(start.data(), start.size());
+    const PictureKind kind = kindOf(startBytes, base::fs::extension(file.name()));
+    if (kind == PictureKind::foreign) {
+        const base::vector<u8> bytes = readStart(file, longest);
+        return withoutOpaqueAlpha(decodePicture({bytes.data(), bytes.size()}));
+    }
+    if (!hasAlphaChannel(startBytes, kind))
+        return nullptr;
+    const base::ref<Image> image = withoutOpaqueAlpha(iio::loadImage(file));
+    return image && !image->hasAlpha() ? image : nullptr;
 }
 
 } // namespace assimp

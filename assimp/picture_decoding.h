@@ -1,13 +1,11 @@
 #pragma once
 
-#include "b_containers.h"
-#include "b_types.h"
+#include "i_image.h"
+#include "stream/b_stream.h"
 
 #include <span>
 
 namespace assimp {
-
-using Bytes = base::vector<base::u8>;
 
 /// What can be done with the bytes of a picture.
 enum class PictureKind {
@@ -15,20 +13,25 @@ enum class PictureKind {
     png,
     jpeg,
     tga,
-    convertible, ///< of a format that only `convertToPng` reads: BMP, GIF, PSD, PNM
+    foreign, ///< of a format that only `decodePicture` reads: BMP, GIF, PSD, PNM
 };
 
 /// Tells the kind by the first bytes (18 are enough). TGA files have no mark of their own: what
-/// looks like one is `tga` if its name says so too and `convertible` else. `extension` is without
+/// looks like one is `tga` if its name says so too and `foreign` else. `extension` is without
 /// dot.
 PictureKind kindOf(std::span<const base::u8> start, base::string_view extension);
 
-/// The picture as a PNG, of an animated one its first frame, without an alpha channel that is
-/// opaque everywhere. Empty if it can't be read or has more than 2^26 pixels.
-Bytes convertToPng(std::span<const base::u8> bytes);
+/// The picture in a file of a foreign format, of an animated one its first frame. Null if it can't
+/// be read or has more than 2^26 pixels.
+base::ref<iio::Image> decodePicture(std::span<const base::u8> bytes);
 
-/// A PNG of `width` times `height` texels of red, green, blue and alpha, without an alpha channel
-/// that is the same everywhere and 0 or 255. Empty if there are none or more than 2^26.
-Bytes encodePng(std::span<const base::u8> texels, base::u32 width, base::u32 height);
+/// `image`, without its alpha if that is opaque everywhere. No format of models reads transparency
+/// out of such a picture, but whoever shows a material with alpha blends it.
+base::ref<iio::Image> withoutOpaqueAlpha(base::ref<iio::Image> image);
+
+/// The picture that exporters should read in the place of the one in `file`, which is named like
+/// it: one of a foreign format, or without alpha that is opaque everywhere. Null if it can stay, or
+/// can't be read, of which exporters tell.
+base::ref<iio::Image> makeReadable(base::Stream& file);
 
 } // namespace assimp

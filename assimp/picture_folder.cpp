@@ -1,7 +1,9 @@
 #include "assimp/picture_folder.h"
 
+#include "b_exception.h"
 #include "b_format.h"
 #include "b_string_convert.h"
+#include "i_file.h"
 #include "stream/b_fs.h"
 
 #include <algorithm>
@@ -38,8 +40,7 @@ void writeFile(const string& path, std::span<const base::u8> bytes) {
 
 } // namespace
 
-string PictureFolder::add(string_view name, string_view extension,
-                          std::span<const base::u8> bytes) {
+string PictureFolder::newPath(string_view name, string_view extension) {
     const string stem = fileNamePart(name, 100, "texture");
     const string ending = fileNamePart(extension, 10, "bin");
     string file = base::format("{}.{}", stem, ending);
@@ -47,8 +48,24 @@ string PictureFolder::add(string_view name, string_view extension,
         file = base::format("{}_{}.{}", stem, i, ending);
     if (!folder_)
         folder_.emplace("pictures");
-    const string path = folder_->path() + file;
+    return folder_->path() + file;
+}
+
+string PictureFolder::add(string_view name, string_view extension,
+                          std::span<const base::u8> bytes) {
+    string path = newPath(name, extension);
     writeFile(path, bytes);
+    return path;
+}
+
+string PictureFolder::add(string_view name, iio::Image& image) {
+    string path = newPath(name, "png");
+    // Exporters will read it soon and make a file of their own.
+    base::AttribMap settings;
+    settings.attribute<base::i32>(iio::imageAttributes().n_CompressionLevel) = 1;
+    if (!iio::saveImage(image, path, settings))
+        throw base::exception("The picture could not be written.", "picture_folder",
+                              "assimp::PictureFolder::add", __LINE__);
     return path;
 }
 

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "b_factory.h"
+#include "i_image.h"
 #include "stream/b_temporary_folder.h"
 
 #include <optional>
@@ -20,9 +21,13 @@ public:
     /// fails.
     base::string add(base::string_view name, base::string_view extension,
                      std::span<const base::u8> bytes);
+    /// The same with a PNG file of `image`.
+    base::string add(base::string_view name, iio::Image& image);
     bool isEmpty() const { return names_.empty(); }
 
 private:
+    base::string newPath(base::string_view name, base::string_view extension);
+
     std::optional<base::fs::TemporaryFolder> folder_; ///< from the first file on
     base::set<base::string> names_;                   ///< in lower case
 };
