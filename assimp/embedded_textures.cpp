@@ -7,7 +7,6 @@
 #include "b_exception.h"
 #include "b_string_convert.h"
 #include "stream/b_fs.h"
-#include "stream/b_stream_workers.h"
 
 #include <assimp/scene.h>
 
@@ -30,32 +29,15 @@ namespace {
     throw base::exception(reason, "embedded_textures", "assimp::writeEmbedded", __LINE__);
 }
 
-/// The extension of a file with these bytes: by what they are, else as the library or the name
-/// has it.
-string extensionOf(const aiTexture& texture, std::span<const u8> bytes, const string& name) {
+string writeCompressed(const aiTexture& texture, const string& name, PictureFolder& folder) {
+    const std::span bytes(reinterpret_cast<const u8*>(texture.pcData), texture.mWidth);
     const string_view hint(texture.achFormatHint,
                            strnlen(texture.achFormatHint, sizeof texture.achFormatHint));
     const string named = fs::extension(name);
-    switch (kindOf(bytes, named.empty() ? hint : string_view(named))) {
-    case PictureKind::png:
-        return "png";
-    case PictureKind::jpeg:
-        return "jpg";
-    case PictureKind::tga:
-        return "tga";
-    default:
-        return hint.empty() ? named : string(hint);
-    }
-}
-
-string writeCompressed(const aiTexture& texture, const string& name, PictureFolder& folder) {
-    const std::span bytes(reinterpret_cast<const u8*>(texture.pcData), texture.mWidth);
-    const string extension = extensionOf(texture, bytes, name);
-    base::vector<u8> content(bytes.begin(), bytes.end());
-    base::Stream file = base::vectorStream(content, "texture." + extension);
-    if (const base::ref<iio::Image> readable = makeReadable(file))
+    const PictureKind kind = kindOf(bytes, named.empty() ? hint : string_view(named));
+    if (const base::ref<iio::Image> readable = makeReadable(bytes, kind, name))
         return folder.add(fs::stem(name), *readable);
-    return folder.add(fs::stem(name), extension, bytes);
+    return folder.add(fs::stem(name), extensionOf(kind), bytes);
 }
 
 /// Texels that are not in a format of their own. Of formats that know no alpha they come with one

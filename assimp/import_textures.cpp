@@ -57,6 +57,19 @@ string joinedList(const vector<string>& texts) {
     return list;
 }
 
+using Bytes = vector<base::u8>;
+
+constexpr u64 greatestFile = u64(1) << 29;
+
+/// The bytes from the start of a file, at most `count`.
+Bytes readBytes(base::Stream& file, u64 count) {
+    Bytes bytes;
+    bytes.resizeUninitialized(std::min(count, file.size()));
+    file.setPosition(0);
+    bytes.resize(file.read(bytes.data(), bytes.size()));
+    return bytes;
+}
+
 } // namespace
 
 TextureImport::TextureImport(const aiScene& source, const string& path,
@@ -110,19 +123,33 @@ string TextureImport::makeFile(const string& path, string_view material, const s
     } catch (const std::exception& e) {
         reason = e.what();
     }
-    base::log().log(base::logScene, base::logWarning,
-                    "assimp |{}| Unable to make a file of the texture '{}', it is {}! {}", material,
-                    path, otherwise.empty() ? "left out" : "taken as it is", reason);
+    base::log().log(base::logScene, base::logWarning, "assimp |{}| The texture '{}' is {}! {}",
+                    material, path, otherwise.empty() ? "left out" : "taken as it is", reason);
     return otherwise;
 }
 
-/// The file, or a PNG of what exporters should read in its place.
+/// The file, or one of what exporters should read in its place: what they can't read, or not under
+/// its name, would make the document invalid.
 string TextureImport::readableFile(const string& file, string_view material) {
-    return makeFile(file, material, file, [&] {
+    string otherwise; // a picture that can't be read is left out
+    return makeFile(file, material, otherwise, [&] {
         base::Stream stream;
         fs::master().open(stream, file, base::fs::openRead);
-        const base::ref<iio::Image> readable = makeReadable(stream);
-        return readable ? pictures_->add(fs::stem(file), *readable) : file;
+        const Bytes start = readBytes(stream, headerLength);
+        const PictureKind kind = kindOf({start.data(), start.size()}, fs::extension(file));
+        const bool isRightlyNamed = isNamed(kind, fs::extension(file));
+        if (isRightlyNamed && !isDoubtful(stream, kind))
+            return file;
+        const Bytes bytes = readBytes(stream, greatestFile);
+        const base::ref<iio::Image> readable =
+            makeReadable({bytes.data(), bytes.size()}, kind, file);
+        if (isRightlyNamed)
+            otherwise = file; // only the folder for files can fail from here on
+        if (readable)
+            return pictures_->add(fs::stem(file), *readable);
+        return isRightlyNamed ? file
+                              : pictures_->add(fs::stem(file), extensionOf(kind),
+                                               {bytes.data(), bytes.size()});
     });
 }
 

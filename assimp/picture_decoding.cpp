@@ -1,8 +1,10 @@
 #include "assimp/picture_decoding.h"
 
+#include "b_exception.h"
 #include "b_string_convert.h"
 #include "i_file.h"
 #include "stream/b_fs.h"
+#include "stream/b_stream_workers.h"
 
 #include <algorithm>
 #include <climits>
@@ -26,6 +28,7 @@ using base::string_view;
 using base::u32;
 using base::u64;
 using base::u8;
+using base::vector;
 using iio::Image;
 
 namespace {
@@ -63,13 +66,14 @@ bool hasAlphaChannel(std::span<const u8> start, PictureKind kind) {
     return kind == PictureKind::tga && start[tgaDepthAt] == 32;
 }
 
-/// The first bytes of the file, at most `count`, from which it is read again.
-base::vector<u8> readStart(base::Stream& file, u64 count) {
-    base::vector<u8> bytes;
-    bytes.resizeUninitialized(std::min(count, file.size()));
-    bytes.resize(file.read(bytes.data(), bytes.size()));
-    file.setPosition(0);
-    return bytes;
+/// True if the last chunk of a PNG file is there.
+bool hasEnd(std::span<const u8> end) {
+    constexpr string_view lastChunk("\0\0\0\0IEND\xAE\x42\x60\x82", 12);
+    return end.size() == lastChunk.size() && startsWith(end, lastChunk);
+}
+
+[[noreturn]] void fail(const char* reason) {
+    throw base::exception(reason, "picture_decoding", "assimp::makeReadable", __LINE__);
 }
 
 } // namespace
@@ -113,19 +117,64 @@ base::ref<Image> withoutOpaqueAlpha(base::ref<Image> image) {
     return image->convertFormat(image->channelCount() == 2 ? Image::kLuminance : Image::kRGB);
 }
 
-base::ref<Image> makeReadable(base::Stream& file) {
-    constexpr u64 headerLength = 26, longest = u64(1) << 29;
-    const base::vector<u8> start = readStart(file, headerLength);
-    const std::span startBytes(start.data(), start.size());
-    const PictureKind kind = kindOf(startBytes, base::fs::extension(file.name()));
-    if (kind == PictureKind::foreign) {
-        const base::vector<u8> bytes = readStart(file, longest);
-        return withoutOpaqueAlpha(decodePicture({bytes.data(), bytes.size()}));
+string_view extensionOf(PictureKind kind) {
+    switch (kind) {
+    case PictureKind::png:
+        return "png";
+    case PictureKind::jpeg:
+        return "jpg";
+    case PictureKind::tga:
+        return "tga";
+    default:
+        return {};
     }
-    if (!hasAlphaChannel(startBytes, kind))
-        return nullptr;
-    const base::ref<Image> image = withoutOpaqueAlpha(iio::loadImage(file));
-    return image && !image->hasAlpha() ? image : nullptr;
+}
+
+bool isNamed(PictureKind kind, string_view extension) {
+    const base::string lowerCase = base::toLower(extension);
+    const string_view expected = extensionOf(kind);
+    return !expected.empty() &&
+           (lowerCase == expected || (kind == PictureKind::jpeg && lowerCase == "jpeg"));
+}
+
+bool isDoubtful(base::Stream& file, PictureKind kind) {
+    constexpr u64 endLength = 12;
+    u8 start[headerLength] = {}, end[endLength] = {};
+    file.setPosition(0);
+    const u64 startCount = file.read(start, std::min(headerLength, file.size()));
+    if (hasAlphaChannel({start, startCount}, kind))
+        return true;
+    if (kind != PictureKind::png || file.size() < endLength)
+        return kind == PictureKind::png;
+    file.setPosition(static_cast<base::i64>(file.size() - endLength));
+    return !hasEnd({end, file.read(end, endLength)});
+}
+
+base::ref<Image> makeReadable(std::span<const u8> bytes, PictureKind kind,
+                              const base::string& name) {
+    if (kind == PictureKind::unknown)
+        fail("It is in no format that can be read.");
+    base::ref<Image> image;
+    if (kind == PictureKind::foreign) {
+        image = withoutOpaqueAlpha(decodePicture(bytes));
+    } else {
+        vector<u8> content(bytes.begin(), bytes.end());
+        // The extension chooses the reader.
+        base::string streamName = name;
+        if (!isNamed(kind, base::fs::extension(name)))
+            streamName.append(".").append(extensionOf(kind));
+        base::Stream file = base::vectorStream(content, streamName);
+        if (!isDoubtful(file, kind))
+            return nullptr;
+        file.setPosition(0);
+        image = iio::loadImage(file);
+    }
+    if (!image)
+        fail("It can't be read.");
+    if (kind == PictureKind::foreign)
+        return image;
+    const base::ref<Image> opaque = withoutOpaqueAlpha(image);
+    return opaque != image ? opaque : nullptr;
 }
 
 } // namespace assimp

@@ -6,12 +6,18 @@
 
 namespace test_support {
 
-/// Imports models with materials. Pictures that need only exist hold nothing.
+/// Imports models with materials.
 class MaterialFixture : public Import {
 protected:
+    /// Writes the beginning and the end of an opaque PNG or a JPEG, for pictures that need only
+    /// exist.
     void touch(const std::string& name) {
+        using namespace std::string_literals;
         std::filesystem::create_directories((folder_ / name).parent_path());
-        write(name, "");
+        const bool isPng = std::filesystem::path(name).extension() == ".png";
+        write(name, isPng ? "\x89PNG\r\n\x1a\n" + std::string(17, '\0') + "\2" +
+                                "\0\0\0\0IEND\xAE\x42\x60\x82"s
+                          : "\xff\xd8\xff"s);
     }
 
     /// A triangle with texture coordinates and one material, "m", with these lines of MTL.

@@ -102,8 +102,8 @@ TEST_F(Textures, EqualOnesAreOneObject) {
 TEST_F(Textures, EmbeddedOnesAreFilesAsLongAsTheScene) {
     FbxText fbx;
     fbx.addMaterial("");
-    const string png = "\x89PNG\r\n\x1a\nrest";
-    fbx.addTexture(50, "C:\\\\art\\\\brick.bin", "DiffuseColor", "", "iVBORw0KGgpyZXN0");
+    const string jpeg = "\xff\xd8\xffrest";
+    fbx.addTexture(50, "C:\\\\art\\\\brick.bin", "DiffuseColor", "", "/9j/cmVzdA==");
     const string path = write("m.fbx", fbx.text());
     // As programs do it: one document for plugins and scene.
     document_ = std::make_unique<SceneFactory>();
@@ -112,9 +112,9 @@ TEST_F(Textures, EmbeddedOnesAreFilesAsLongAsTheScene) {
     const base::IPlugin* map = texture(Schema::n_colorMap);
     ASSERT_TRUE(map);
     const std::filesystem::path file = *find(*map, fileTexture_schema::n_file);
-    EXPECT_EQ(file.filename(), "brick.png");
+    EXPECT_EQ(file.filename(), "brick.jpg");
     std::ifstream stream(file, std::ios::binary);
-    EXPECT_EQ(string(std::istreambuf_iterator<char>(stream), {}), png);
+    EXPECT_EQ(string(std::istreambuf_iterator<char>(stream), {}), jpeg);
     document_.reset();
     EXPECT_FALSE(std::filesystem::exists(file.parent_path()));
 }
@@ -126,12 +126,12 @@ TEST(EmbeddedTextures, NamesOfTheirFiles) {
         const char* hint;
         const char* expected;
     } cases[] = {
-        {"", "*3", "dds", "texture3.dds"},
-        {"", "*4", "", "texture4.bin"},
-        {"../..\\evil\x01.dds", "*0", "", "evil.dds"},
-        {"evil.dds", "*0", "", "evil_2.dds"},
-        {"EVIL.DDS", "*0", "dds", "EVIL_3.dds"},
-        {"..", "*0", "../x", "....x"},
+        {"", "*3", "jpg", "texture3.jpg"},
+        {"", "*4", "", "texture4.jpg"},
+        {"../..\\evil\x01.png", "*0", "", "evil.jpg"},
+        {"evil.jpg", "*0", "", "evil_2.jpg"},
+        {"EVIL.JPG", "*0", "png", "EVIL_3.jpg"},
+        {"..", "*0", "../x", "..jpg"},
     };
     const base::ref<assimp::PictureFolder> folder = base::makeRef<assimp::PictureFolder>();
     for (const auto& c : cases) {
@@ -140,7 +140,7 @@ TEST(EmbeddedTextures, NamesOfTheirFiles) {
         texture.mFilename = c.name;
         std::strcpy(texture.achFormatHint, c.hint);
         texture.mWidth = 4;
-        texture.pcData = new aiTexel[1]();
+        texture.pcData = new aiTexel[1]{{0xff, 0xd8, 0xff, 0xe0}}; // a JPEG, whatever it is called
         const std::filesystem::path path = assimp::writeEmbedded(texture, c.path, *folder);
         EXPECT_EQ(std::filesystem::file_size(path), 4u);
         EXPECT_EQ(path.filename(), c.expected);
