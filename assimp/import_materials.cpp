@@ -63,10 +63,11 @@ bool isNamed(const TextureSlot& slot, std::initializer_list<string_view> words) 
 /// Fills one `principalMaterial`.
 class MaterialMaker {
 public:
-    MaterialMaker(const aiMaterial& source, const aiMesh& mesh, const MaterialFormat& format,
-                  TextureImport& textures, MaterialFaults& faults, base::IPlugin& object)
+    MaterialMaker(const aiMaterial& source, const aiMesh& mesh, bool isMapped,
+                  const MaterialFormat& format, TextureImport& textures, MaterialFaults& faults,
+                  base::IPlugin& object)
         : properties_(source), mesh_(mesh), format_(format), textures_(textures), faults_(faults),
-          object_(object) {}
+          isMapped_(isMapped), object_(object) {}
 
     void run() {
         const string_view name = properties_.readText({AI_MATKEY_NAME});
@@ -113,6 +114,7 @@ private:
     const MaterialFormat& format_;
     TextureImport& textures_;
     MaterialFaults& faults_;
+    bool isMapped_; ///< its geometry has texture coordinates
     base::IPlugin& object_;
     base::set<string_view> broken_; ///< names of properties with numbers that are not finite
 };
@@ -143,6 +145,8 @@ std::optional<float> MaterialMaker::readNumber(const PropertyKey& key) {
 /// The first map of these kinds whose file was found; else one whose file was not, if there is any.
 TextureSlot MaterialMaker::firstMap(std::initializer_list<unsigned> types) {
     TextureSlot missing;
+    if (!isMapped_)
+        return missing;
     for (const unsigned type : types) {
         TextureSlot slot = textures_.read(properties_, type);
         if (slot)
@@ -389,12 +393,11 @@ MaterialImport::MaterialImport(const aiScene& source, const string& path,
           factory) {}
 
 void MaterialImport::assign(const aiMesh& mesh, const GeometryObjects& objects) {
-    if (objects.empty())
-        return;
-    const base::ref<base::IPlugin> material = materialOf(mesh);
-    if (!material)
-        return;
     for (const base::ref<base::IPlugin>& object : objects) {
+        const base::AttribArray* sets = find(*object, scene::mesh_schema::n_uvSets);
+        const base::ref<base::IPlugin> material = materialOf(mesh, sets && sets->size() != 0);
+        if (!material)
+            continue;
         if (object->typeName() == scene::lines_schema::n_kind)
             write(*object, scene::lines_schema::n_materials).push_back(material);
         const base::AttribArray* primitives = find(*object, scene::mesh_schema::n_primitives);
@@ -404,15 +407,15 @@ void MaterialImport::assign(const aiMesh& mesh, const GeometryObjects& objects) 
     }
 }
 
-base::ref<base::IPlugin> MaterialImport::materialOf(const aiMesh& mesh) {
-    const auto [at, isNew] = materials_.try_emplace(mesh.mMaterialIndex);
+base::ref<base::IPlugin> MaterialImport::materialOf(const aiMesh& mesh, bool isMapped) {
+    const auto [at, isNew] = materials_.try_emplace(std::pair(mesh.mMaterialIndex, isMapped));
     const aiMaterial* source = mesh.mMaterialIndex < source_.mNumMaterials
                                    ? source_.mMaterials[mesh.mMaterialIndex]
                                    : nullptr;
     if (!isNew || !source || isMadeUp(*source))
         return at->second;
     at->second = factory_.create(Material::n_kind);
-    MaterialMaker(*source, mesh, format_, textures_, faults_, *at->second).run();
+    MaterialMaker(*source, mesh, isMapped, format_, textures_, faults_, *at->second).run();
     return at->second;
 }
 

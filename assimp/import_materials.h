@@ -42,7 +42,8 @@ public:
     MaterialImport(const aiScene& source, const base::string& path, const base::AttribMap& importer,
                    base::PluginFactory& factory);
 
-    /// Gives the objects of `mesh` its material, if the file has one for it.
+    /// Gives the objects of `mesh` its material, if the file has one for it. Those without texture
+    /// coordinates get it without maps: a document in which such geometry has maps is invalid.
     void assign(const aiMesh& mesh, const GeometryObjects& objects);
 
     MaterialFaults faults() const;
@@ -51,14 +52,15 @@ public:
     base::ref<base::IPlugin> pictures() const;
 
 private:
-    base::ref<base::IPlugin> materialOf(const aiMesh& mesh);
+    base::ref<base::IPlugin> materialOf(const aiMesh& mesh, bool isMapped);
 
     const aiScene& source_;
     base::PluginFactory& factory_;
     MaterialFormat format_;
     TextureImport textures_;
     MaterialFaults faults_;
-    base::map<base::u32, base::ref<base::IPlugin>> materials_; ///< by index; null for none
+    /// By index, with maps or without; null for none.
+    base::map<std::pair<base::u32, bool>, base::ref<base::IPlugin>> materials_;
 };
 
 } // namespace assimp

@@ -44,12 +44,16 @@ struct FbxText {
                (objects.empty() ? "" : "C: \"OO\",40,20\n") + connections + "}\n";
     }
 
-    /// Adds the material "paint".
+    /// Adds the material "paint", and texture coordinates.
     void addMaterial(const std::string& values) {
-        layers += "LayerElementMaterial: 0 {\nVersion: 101\nName: \"\"\n"
+        layers += "LayerElementUV: 0 {\nVersion: 101\nName: \"uv\"\n"
+                  "MappingInformationType: \"ByPolygonVertex\"\n"
+                  "ReferenceInformationType: \"Direct\"\nUV: *8 {\na: 0,0,1,0,1,1,0,1\n}\n}\n"
+                  "LayerElementMaterial: 0 {\nVersion: 101\nName: \"\"\n"
                   "MappingInformationType: \"AllSame\"\n"
                   "ReferenceInformationType: \"IndexToDirect\"\nMaterials: *1 {\na: 0\n}\n}\n"
                   "Layer: 0 {\nVersion: 100\nLayerElement:  {\nType: \"LayerElementMaterial\"\n"
+                  "TypedIndex: 0\n}\nLayerElement:  {\nType: \"LayerElementUV\"\n"
                   "TypedIndex: 0\n}\n}\n";
         objects += "Material: 40, \"Material::paint\", \"\" {\nVersion: 102\n"
                    "ShadingModel: \"phong\"\nProperties70:  {\n" +

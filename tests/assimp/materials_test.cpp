@@ -103,6 +103,24 @@ TEST_F(Materials, MapsOfMtl) {
     }
 }
 
+/// Maps need texture coordinates, which lines and some meshes have not.
+TEST_F(Materials, HaveMapsOnlyWhereThereAreCoordinates) {
+    touch("c.png");
+    write("m.mtl", "newmtl m\nKd 1 0 0\nmap_Kd c.png\n");
+    ASSERT_TRUE(load("m.obj", "mtllib m.mtl\nv 0 0 0\nv 1 0 0\nv 0 1 0\nvt 0 0\nvt 1 0\nvt 0 1\n"
+                              "o a\nusemtl m\nf 1/1 2/2 3/3\no b\nusemtl m\nf 1 2 3\nl 1 2\n"));
+    for (base::IPlugin* mesh : objects(mesh_schema::n_kind)) {
+        const auto& primitive = *findListItem(*mesh, mesh_schema::n_primitives, 0);
+        const base::IPlugin& shown = *(*find(primitive, meshPrimitive_schema::n_materials))[0];
+        EXPECT_EQ(findObject(shown, Schema::n_colorMap) != nullptr,
+                  mesh->findAttribute(mesh_schema::n_uvSets) != nullptr);
+    }
+    const base::IPlugin& lines = only(lines_schema::n_kind);
+    EXPECT_EQ(findObject(*(*find(lines, lines_schema::n_materials))[0], Schema::n_colorMap),
+              nullptr);
+    EXPECT_EQ(objects(Schema::n_kind).size(), 2u);
+}
+
 TEST_F(Materials, BelongToPolygonsAndLinesAndAreShared) {
     write("two.mtl", "newmtl red\nKd 1 0 0\nnewmtl unused\nKd 0 1 0\n");
     const string model = "mtllib two.mtl\nv 0 0 0\nv 1 0 0\nv 0 1 0\n"

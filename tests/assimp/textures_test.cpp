@@ -54,8 +54,8 @@ TEST_F(Textures, AreSearchedForInOrder) {
         SCOPED_TRACE(c.path);
         write("models/m.mtl", "newmtl m\nmap_Kd " + c.path + "\n");
         LogCapture log;
-        ASSERT_TRUE(load("models/m.obj", "mtllib m.mtl\nv 0 0 0\nv 1 0 0\nv 0 1 0\no part\n"
-                                         "usemtl m\nf 1 2 3\n"));
+        ASSERT_TRUE(load("models/m.obj", "mtllib m.mtl\nv 0 0 0\nv 1 0 0\nv 0 1 0\nvt 0 0\no part\n"
+                                         "usemtl m\nf 1/1 2/1 3/1\n"));
         EXPECT_EQ(fileOf(Schema::n_colorMap), c.expected);
         EXPECT_EQ(problems(log), "");
     }
@@ -65,8 +65,8 @@ TEST_F(Textures, MissingOnesAreWarnedOfOnceAndLeftOut) {
     write("two.mtl", "newmtl a\nKd 1 0 0\nmap_Kd x\\gone.png\nmap_Ke x\\gone.png\n"
                      "newmtl b\nmap_Kd x\\gone.png\n");
     LogCapture log;
-    ASSERT_TRUE(load("two.obj", "mtllib two.mtl\nv 0 0 0\nv 1 0 0\nv 0 1 0\no part\n"
-                                "usemtl a\nf 1 2 3\nusemtl b\nf 3 2 1\n"));
+    ASSERT_TRUE(load("two.obj", "mtllib two.mtl\nv 0 0 0\nv 1 0 0\nv 0 1 0\nvt 0 0\no part\n"
+                                "usemtl a\nf 1/1 2/1 3/1\nusemtl b\nf 3/1 2/1 1/1\n"));
     EXPECT_TRUE(objects(fileTexture_schema::n_kind).empty());
     const string text = problems(log), at = folder_.string();
     EXPECT_EQ(std::ranges::count(text, '\n'), 1) << text;
@@ -81,9 +81,9 @@ TEST_F(Textures, EqualOnesAreOneObject) {
     touch("c.png");
     write("four.mtl", "newmtl a\nmap_Kd c.png\nmap_Ke ./c.png\nnewmtl b\nmap_Kd c.png\n"
                       "newmtl c\nmap_Kd -clamp on c.png\nnewmtl d\nmap_Kd c.png\nmap_Pr c.png\n");
-    ASSERT_TRUE(load("four.obj", "mtllib four.mtl\nv 0 0 0\nv 1 0 0\nv 0 1 0\n"
-                                 "o a\nusemtl a\nf 1 2 3\no b\nusemtl b\nf 1 2 3\n"
-                                 "o c\nusemtl c\nf 1 2 3\no d\nusemtl d\nf 1 2 3\n"));
+    ASSERT_TRUE(load("four.obj", "mtllib four.mtl\nv 0 0 0\nv 1 0 0\nv 0 1 0\nvt 0 0\n"
+                                 "o a\nusemtl a\nf 1/1 2/1 3/1\no b\nusemtl b\nf 1/1 2/1 3/1\n"
+                                 "o c\nusemtl c\nf 1/1 2/1 3/1\no d\nusemtl d\nf 1/1 2/1 3/1\n"));
     const auto materials = objects(Schema::n_kind);
     ASSERT_EQ(materials.size(), 4u);
     const auto map = [&](std::size_t i, const SchemaAttribute<Object>& attribute) {
