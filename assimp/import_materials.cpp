@@ -331,16 +331,21 @@ void MaterialMaker::writeOcclusion() {
     write(object_, Material::n_ambientType) = ambientIsOcclusion;
 }
 
+bool hasTextures(const aiMaterial& material) {
+    const MaterialProperties properties(material);
+    for (unsigned type = 1; type <= AI_TEXTURE_TYPE_MAX; ++type)
+        if (!properties.readText({AI_MATKEY_TEXTURE(type, 0)}).empty())
+            return true;
+    return false;
+}
+
 /// True for the material that readers make where a file has none: without a name of its own and
 /// with nothing but one of their greys.
 bool isMadeUp(const aiMaterial& material) {
     const MaterialProperties properties(material);
     const string_view name = properties.readText({AI_MATKEY_NAME});
-    if (!name.empty() && name != AI_DEFAULT_MATERIAL_NAME)
+    if ((!name.empty() && name != AI_DEFAULT_MATERIAL_NAME) || hasTextures(material))
         return false;
-    for (unsigned type = 1; type <= AI_TEXTURE_TYPE_MAX; ++type)
-        if (!properties.readText({AI_MATKEY_TEXTURE(type, 0)}).empty())
-            return false;
     std::array<float, 3> color = {1, 1, 1};
     properties.read({AI_MATKEY_COLOR_DIFFUSE}, color);
     std::array<float, 1> exponent = {0}, opacity = {1};
@@ -407,12 +412,15 @@ void MaterialImport::assign(const aiMesh& mesh, const GeometryObjects& objects) 
     }
 }
 
-base::ref<base::IPlugin> MaterialImport::materialOf(const aiMesh& mesh, bool isMapped) {
-    const auto [at, isNew] = materials_.try_emplace(std::pair(mesh.mMaterialIndex, isMapped));
+base::ref<base::IPlugin> MaterialImport::materialOf(const aiMesh& mesh, bool hasCoordinates) {
     const aiMaterial* source = mesh.mMaterialIndex < source_.mNumMaterials
                                    ? source_.mMaterials[mesh.mMaterialIndex]
                                    : nullptr;
-    if (!isNew || !source || isMadeUp(*source))
+    if (!source)
+        return nullptr;
+    const bool isMapped = hasCoordinates && hasTextures(*source);
+    const auto [at, isNew] = materials_.try_emplace(std::pair(mesh.mMaterialIndex, isMapped));
+    if (!isNew || isMadeUp(*source))
         return at->second;
     at->second = factory_.create(Material::n_kind);
     MaterialMaker(*source, mesh, isMapped, format_, textures_, faults_, *at->second).run();

@@ -52,7 +52,7 @@ public:
     base::ref<base::IPlugin> pictures() const;
 
 private:
-    base::ref<base::IPlugin> materialOf(const aiMesh& mesh, bool isMapped);
+    base::ref<base::IPlugin> materialOf(const aiMesh& mesh, bool hasCoordinates);
 
     const aiScene& source_;
     base::PluginFactory& factory_;
