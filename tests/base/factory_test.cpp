@@ -1,5 +1,6 @@
 #include "b_factory.h"
 
+#include "b_attribute_desc.h"
 #include "b_exception.h"
 #include "log_capture.h"
 
@@ -248,6 +249,21 @@ TEST_F(FactoryTest, AddedInterfacesAreFoundByName) {
     object->addInterface(&second);
     EXPECT_EQ(object->queryInterface(named("IExtra")), &second);
     EXPECT_EQ(object->queryInterface(named("IUnknown")), nullptr);
+}
+
+TEST(AttribDescManager, KnowsTheWholeChain) {
+    AttribDescManager& manager = attribDescManager();
+    const name_id animal = named("animal"), cat = named("cat"), lion = named("lion"),
+                  rock = named("rock"), ring = named("ring");
+    manager.addClass(lion, cat);
+    manager.addClass(cat, animal);
+    manager.addClass(lion, rock); // another claim changes nothing
+    manager.addClass(ring, ring);
+    for (const name_id base : {animal, cat, lion})
+        EXPECT_TRUE(manager.derivesFrom(lion, base)) << base.text();
+    EXPECT_FALSE(manager.derivesFrom(lion, rock));
+    EXPECT_FALSE(manager.derivesFrom(animal, lion));
+    EXPECT_FALSE(manager.derivesFrom(ring, rock));
 }
 
 TEST_F(FactoryTest, ClonesAreObjectsOrPlainMaps) {

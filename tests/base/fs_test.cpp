@@ -1,6 +1,7 @@
 #include "stream/b_fs.h"
 
 #include "stream/b_stream_workers.h"
+#include "stream/b_temporary_folder.h"
 
 #include <cerrno>
 #include <csignal>
@@ -364,6 +365,26 @@ TEST_F(FsTest, MakesTemporaryNames) {
     EXPECT_EQ(outcome([] { tmpPath(); }), api(ENOTDIR));
     unsetenv("TMPDIR");
     EXPECT_EQ(tmpPath(), "/tmp/");
+}
+
+TEST_F(FsTest, TemporaryFoldersEndWithTheirFiles) {
+    setenv("TMPDIR", folder_.c_str(), 1);
+    string first;
+    {
+        const TemporaryFolder one("made"), two("made");
+        first = one.path();
+        EXPECT_NE(first, two.path());
+        EXPECT_TRUE(first.starts_with(folder_ + "made") && first.ends_with('/')) << first;
+        EXPECT_EQ(stdfs::status(first).permissions(), stdfs::perms::owner_all);
+        stdfs::create_directories(first + "sub/sub");
+        std::ofstream(first + "sub/file") << "x";
+    }
+    EXPECT_TRUE(stdfs::is_empty(folder_));
+    for (const string& place : {path("none"), string("/proc")}) {
+        setenv("TMPDIR", place.c_str(), 1);
+        EXPECT_EQ(outcome([] { TemporaryFolder(); }), api(ENOENT)) << place;
+    }
+    unsetenv("TMPDIR");
 }
 
 /// Owns what lies under "vault/" and offers little.
