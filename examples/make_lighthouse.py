@@ -1,17 +1,23 @@
 #!/usr/bin/env python3
-"""Writes lighthouse.dae: a small island with a lighthouse, as a COLLADA document.
+"""Writes lighthouse.dae, a small island with a lighthouse as a COLLADA document, and its pictures.
 
 Uses what real content uses: a deep tree of named nodes, meshes that many nodes share, polygons of
 three, four and many corners (concave ones too), normals, texture coordinates and colours at the
-vertices. It has no materials: the colours make the picture.
+vertices. Most surfaces are white paint under these colours; a few have materials with more to them:
+maps, gloss, transparency, light of their own.
 
-    make_lighthouse.py > lighthouse.dae
+    make_lighthouse.py [FOLDER]
 
-The output depends on nothing but this script.
+writes FOLDER/lighthouse.dae and FOLDER/textures/*.png, where FOLDER is that of the script unless
+given. The output depends on nothing but this script and the compressor of zlib.
 """
 
 import math
+import pathlib
 import random
+import struct
+import sys
+import zlib
 
 # sRGB, as a painter would pick them.
 PALETTE = {
@@ -103,15 +109,177 @@ def scaled(points, factor, y):
     return [(x * factor, y, z * factor) for x, _, z in points]
 
 
+# Pictures.
+
+
+class Picture:
+    """Eight bits a channel, from a function of column and row that gives a tuple from 0 to 1. The
+    number of channels tells the kind: 1 grey, 3 RGB, 4 RGBA."""
+
+    def __init__(self, name, width, height, pixel):
+        self.name = name
+        self.width, self.height = width, height
+        self.rows = [[pixel(x, y) for x in range(width)] for y in range(height)]
+
+    def encoded(self):
+        """The bytes of a PNG file."""
+
+        def chunk(kind, data):
+            check = zlib.crc32(kind + data)
+            return struct.pack(">I", len(data)) + kind + data + struct.pack(">I", check)
+
+        kind = {1: 0, 3: 2, 4: 6}[len(self.rows[0][0])]
+        header = struct.pack(">IIBBBBB", self.width, self.height, 8, kind, 0, 0, 0)
+        data = bytearray()
+        for row in self.rows:
+            data.append(0)  # the row is not filtered
+            data += bytes(round(255 * min(max(v, 0.0), 1.0)) for pixel in row for v in pixel)
+        return (b"\x89PNG\r\n\x1a\n" + chunk(b"IHDR", header) +
+                chunk(b"IDAT", zlib.compress(bytes(data), 9)) + chunk(b"IEND", b""))
+
+
+def srgb(name, shade=1.0):
+    """A colour of the palette as it stands in a picture."""
+    return tuple(shade * (PALETTE[name] >> shift & 255) / 255 for shift in (16, 8, 0))
+
+
+STRIPES = 7
+COURSES = 4  # of blocks, in each stripe
+BLOCK = (16, 8)  # in pixels, with half of the joints round it
+BLOCKS_ROUND = 12
+TOWER_PIXELS = (BLOCK[0] * BLOCKS_ROUND, BLOCK[1] * COURSES * STRIPES)
+
+
+def masonry(x, y):
+    """The block at a pixel, as column and course from below, and its distance to a joint."""
+    width, height = BLOCK
+    course = (TOWER_PIXELS[1] - 1 - y) // height
+    x = (x + width // 2 * (course % 2)) % TOWER_PIXELS[0]
+    inset = min(x % width, width - 1 - x % width, y % height, height - 1 - y % height)
+    return x // width, course, inset
+
+
+def tower_paint():
+    rng = random.Random(17)
+    shades = [[1 - 0.07 * rng.random() for _ in range(BLOCKS_ROUND)]
+              for _ in range(COURSES * STRIPES)]
+
+    def pixel(x, y):
+        column, course, inset = masonry(x, y)
+        name = "red" if course // COURSES % 2 else "white"
+        return srgb(name, shades[course][column] * (0.86 if inset == 0 else 1))
+
+    return Picture("tower", *TOWER_PIXELS, pixel)
+
+
+def tower_relief():
+    """Heights: joints are deep, blocks round at their edges."""
+    return Picture("tower_relief", *TOWER_PIXELS,
+                   lambda x, y: ((0.5, 0.62, 0.65)[min(masonry(x, y)[2], 2)],))
+
+
+def tower_shadow():
+    """How much light of the sky comes to the wall: less at the foot and under the gallery."""
+    size = 64
+
+    def pixel(_, y):
+        foot, top = (size - 0.5 - y) / size, (y + 0.5) / size
+        return (1 - 0.7 * math.exp(-14 * foot) - 0.8 * math.exp(-18 * top),)
+
+    return Picture("tower_shadow", 4, size, pixel)
+
+
+def ripples():
+    """Heights of water: waves that fit the borders of the picture, so that it can be tiled."""
+    size = 64
+    rng = random.Random(8)
+    waves = [(rng.randint(-7, 7), rng.randint(-7, 7), rng.random()) for _ in range(9)]
+
+    def pixel(x, y):
+        heights = (math.sin(math.tau * ((a * x + b * y) / size + phase)) for a, b, phase in waves)
+        return (0.5 + 0.025 * sum(heights),)
+
+    return Picture("ripples", size, size, pixel)
+
+
+GLYPHS = {  # rows of five pixels, from above
+    "A": (0x0E, 0x11, 0x11, 0x1F, 0x11, 0x11, 0x11),
+    "B": (0x1E, 0x11, 0x11, 0x1E, 0x11, 0x11, 0x1E),
+    "H": (0x11, 0x11, 0x11, 0x1F, 0x11, 0x11, 0x11),
+    "O": (0x0E, 0x11, 0x11, 0x11, 0x11, 0x11, 0x0E),
+    "R": (0x1E, 0x11, 0x11, 0x1E, 0x14, 0x12, 0x11),
+    "U": (0x11, 0x11, 0x11, 0x11, 0x11, 0x11, 0x0E),
+}
+
+
+def signboard():
+    """A board whose shape is cut out by alpha: oblique corners, and two holes for ropes."""
+    width, height, text, size = 128, 48, "HARBOUR", 2
+
+    def is_letter(x, y):
+        column = (x - (width - (6 * len(text) - 1) * size) // 2) // size
+        row = (y - (height - 7 * size) // 2) // size
+        if not (0 <= column < 6 * len(text) and 0 <= row < 7 and column % 6 < 5):
+            return False
+        return GLYPHS[text[column // 6]][row] >> 4 - column % 6 & 1 == 1
+
+    def pixel(x, y):
+        side, edge = min(x, width - 1 - x), min(y, height - 1 - y)
+        rim = min(side, edge, (side + edge - 12) / math.sqrt(2))
+        hole = math.hypot(side - 11, y - height / 2 + 0.5) - 3
+        paint = srgb("cream" if is_letter(x, y) or 4 <= rim < 6 else "hull")
+        return (*paint, min(1, rim + 0.5, hole + 0.5))
+
+    return Picture("signboard", width, height, pixel)
+
+
+def pictures():
+    return [make() for make in (tower_paint, tower_relief, tower_shadow, ripples, signboard)]
+
+
+# Materials.
+
+
+class Material:
+    """White and matte if not told otherwise. Maps are names of pictures."""
+
+    def __init__(self, name, emission=None, shininess=None, opacity=1.0, colour_map=None,
+                 cut_out=False, bump_map=None, occlusion_map=None):
+        self.name = name
+        self.emission = emission
+        self.shininess = shininess  # the exponent of Phong's highlight
+        self.opacity = opacity
+        self.colour_map = colour_map
+        self.cut_out = cut_out  # whether the alpha of the colour map counts
+        self.bump_map = bump_map
+        self.occlusion_map = occlusion_map
+
+    def maps(self):
+        return [m for m in (self.occlusion_map, self.colour_map, self.bump_map) if m]
+
+
+MATERIALS = {material.name: material for material in (
+    Material("Paint"),
+    Material("Masonry", colour_map="tower", bump_map="tower_relief", occlusion_map="tower_shadow"),
+    Material("Water", shininess=120, bump_map="ripples"),
+    Material("Glass", shininess=400, opacity=0.3),
+    Material("Light", emission=colour("lamp")),
+    Material("Metal", shininess=30),
+    Material("Signboard", colour_map="signboard", cut_out=True),
+)}
+
+
 # Meshes.
 
 
 class Mesh:
-    """Polygons with a normal, a colour and perhaps texture coordinates at each corner."""
+    """Polygons of one material, with a normal and a colour at each corner, and with texture
+    coordinates if the material has maps."""
 
-    def __init__(self, name, textured=False):
+    def __init__(self, name, material="Paint"):
         self.name = name
-        self.textured = textured
+        self.material = material
+        self.textured = bool(MATERIALS[material].maps())
         self.polygons = []
         self.pools = {"position": {}, "normal": {}, "uv": {}, "colour": {}}
 
@@ -130,12 +298,13 @@ class Mesh:
         for i, point in enumerate(points):
             corner = [self.index("position", point, 4), self.index("normal", normals[i], 4)]
             if self.textured:
-                corner.append(self.index("uv", uvs[i] if uvs else (0.0, 0.0), 4))
+                corner.append(self.index("uv", uvs[i], 4))
             corners.append((*corner, self.index("colour", colours[i], 3)))
         self.polygons.append(corners)
 
-    def band(self, lower, upper, low, high, smooth=False, v=(0.0, 1.0)):
-        """Quads between two rings of the same number of corners, with a colour for each ring."""
+    def band(self, lower, upper, low, high, smooth=False, turns=1, v=(0.0, 1.0)):
+        """Quads between two rings of the same number of corners, with a colour for each ring. A
+        texture goes round `turns` times."""
         n = len(lower)
         rise = polygon_normal([lower[0], lower[1], upper[1], upper[0]])[1]
         flat = math.sqrt(1 - rise * rise)
@@ -147,7 +316,8 @@ class Mesh:
         for i in range(n):
             k = (i + 1) % n
             points = [lower[i], lower[k], upper[k], upper[i]]
-            uvs = [(i / n, v[0]), ((i + 1) / n, v[0]), ((i + 1) / n, v[1]), (i / n, v[1])]
+            u = (turns * i / n, turns * (i + 1) / n)
+            uvs = [(u[0], v[0]), (u[1], v[0]), (u[1], v[1]), (u[0], v[1])]
             normals = [outward(p) for p in points] if smooth else None
             self.face(points, [low, low, high, high], uvs, normals)
 
@@ -155,19 +325,16 @@ class Mesh:
         for i in range(len(base)):
             self.face([base[i], base[(i + 1) % len(base)], tip], [low, low, high])
 
-    def cap(self, points, paint, size=4.0):
-        """A polygon of any number of corners, its texture laid on from above."""
+    def cap(self, points, paint, size=1.0):
+        """A polygon of any number of corners, its texture, of this size, laid on from above."""
         self.face(points, paint, [(x / size, -z / size) for x, _, z in points])
 
     def box(self, low, high, paint, top=None):
         (x0, y0, z0), (x1, y1, z1) = low, high
         c = [(x, y, z) for y in (y0, y1) for x, z in ((x0, z1), (x1, z1), (x1, z0), (x0, z0))]
         for k in ((0, 1, 5, 4), (1, 2, 6, 5), (2, 3, 7, 6), (3, 0, 4, 7), (3, 2, 1, 0)):
-            width = math.dist(c[k[0]], c[k[1]])
-            height = math.dist(c[k[1]], c[k[2]])
-            self.face([c[i] for i in k], paint, [(0, 0), (width, 0), (width, height), (0, height)])
-        self.face([c[i] for i in (4, 5, 6, 7)], top or paint,
-                  [(0, 0), (x1 - x0, 0), (x1 - x0, z1 - z0), (0, z1 - z0)])
+            self.face([c[i] for i in k], paint)
+        self.face([c[i] for i in (4, 5, 6, 7)], top or paint)
 
     def prism(self, outline, y0, y1, side, top, bottom=None):
         """An upright prism over an outline; its bottom is left open unless it has a colour."""
@@ -247,7 +414,7 @@ def shore_outline(corners, radius, seed):
 
 
 def sea():
-    mesh = Mesh("sea", textured=True)
+    mesh = Mesh("sea", material="Water")
     n, radii = 48, (6.5, 10.8, 12.6, 14.6)
     paints = [colour(c) for c in ("sea_shore", "sea_shore", "sea_mid", "sea_deep")]
     rings = [ring(n, r, 0) for r in radii]
@@ -259,13 +426,14 @@ def sea():
             shades = [paints[k], paints[k + 1], paints[k + 1], paints[k]]
             mesh.face(points, shades, [(x / 8, -z / 8) for x, _, z in points])
     bottom = ring(n, 13.8, -1.4)
-    mesh.band(bottom, rings[3], colour("sea_edge"), colour("sea_deep"), smooth=True)
+    mesh.band(bottom, rings[3], colour("sea_edge"), colour("sea_deep"), smooth=True,
+              turns=11, v=(0.0, 0.2))
     mesh.cap(bottom[::-1], colour("sea_edge"), 8)
     return mesh
 
 
 def beach():
-    mesh = Mesh("beach", textured=True)
+    mesh = Mesh("beach")
     outline = shore_outline(40, 10.2, 11)
     mesh.band(scaled(outline, 1.13, -0.25), scaled(outline, 1, 0.32), colour("sand_wet"),
               colour("sand"))
@@ -274,7 +442,7 @@ def beach():
 
 
 def meadow():
-    mesh = Mesh("meadow", textured=True)
+    mesh = Mesh("meadow")
     outline = shore_outline(32, 8.3, 5)
     foot, edge = scaled(outline, 1.06, 0.2), scaled(outline, 1, GROUND - 0.18)
     mesh.band(foot, edge, colour("cliff_dark"), colour("cliff"))
@@ -290,26 +458,25 @@ def gear_base():
         for step, radius in ((0.0, 2.45), (0.18, 2.75), (0.5, 2.75), (0.68, 2.45)):
             angle = math.tau * (tooth + step) / 16
             outline.append((radius * math.cos(angle), 0.0, -radius * math.sin(angle)))
-    mesh = Mesh("gear_base", textured=True)
+    mesh = Mesh("gear_base")
     mesh.prism(outline, -0.1, 0.35, colour("slate"), colour("slate_light"))
     mesh.prism(ring(8, 2.25, 0, 0.5), 0.35, 0.7, colour("slate"), colour("slate_light"))
     return mesh
 
 
 def tower_shaft():
-    mesh = Mesh("tower_shaft", textured=True)
-    stripes = 7
-    for i in range(stripes):
-        y = [TOWER_HEIGHT * k / stripes for k in (i, i + 1)]
-        paint = colour("red" if i % 2 else "white")
-        rings = [ring(TOWER_SEGMENTS, tower_radius(height), height) for height in y]
-        mesh.band(rings[0], rings[1], mix(paint, (0, 0, 0), 0.12 if i == 0 else 0), paint,
-                  smooth=True, v=(i / stripes, (i + 1) / stripes))
+    """A ring at each stripe of its picture; the colours only darken the foot."""
+    mesh = Mesh("tower_shaft", material="Masonry")
+    heights = [TOWER_HEIGHT * k / STRIPES for k in range(STRIPES + 1)]
+    rings = [ring(TOWER_SEGMENTS, tower_radius(height), height) for height in heights]
+    for i in range(STRIPES):
+        mesh.band(rings[i], rings[i + 1], (0.88, 0.88, 0.88) if i == 0 else (1, 1, 1), (1, 1, 1),
+                  smooth=True, v=(i / STRIPES, (i + 1) / STRIPES))
     return mesh
 
 
 def gallery_floor():
-    mesh = Mesh("gallery_floor", textured=True)
+    mesh = Mesh("gallery_floor")
     top = TOWER_RADII[1]
     mesh.band(ring(TOWER_SEGMENTS, top, -0.5), ring(TOWER_SEGMENTS, top + 0.42, 0),
               colour("slate_light"), colour("white"), smooth=True)
@@ -321,7 +488,7 @@ def gallery_floor():
 
 def gallery_rail():
     """A bar along one side of the octagon, centred on its middle."""
-    mesh = Mesh("gallery_rail")
+    mesh = Mesh("gallery_rail", material="Metal")
     half = 1.7 * math.sin(math.pi / 8)
     for y in (0.42, 0.85):
         mesh.box((-half, y, -0.03), (half, y + 0.06, 0.03), colour("iron"))
@@ -329,15 +496,23 @@ def gallery_rail():
 
 
 def lantern_wall():
-    mesh = Mesh("lantern_wall", textured=True)
+    mesh = Mesh("lantern_wall")
     mesh.band(ring(8, 0.95, 0, 0.5), ring(8, 0.95, 0.5, 0.5), colour("red", 0.8), colour("red"))
     mesh.cap(ring(8, 0.95, 0.5, 0.5), colour("slate"))
     return mesh
 
 
+def lantern_glass():
+    """Panes between the mullions."""
+    mesh = Mesh("lantern_glass", material="Glass")
+    mesh.band(ring(8, 0.86, 0.5, 0.5), ring(8, 0.86, 1.5, 0.5), colour("sea_shore"),
+              colour("white"))
+    return mesh
+
+
 def lamp():
     """A smooth ball of light."""
-    mesh = Mesh("lamp")
+    mesh = Mesh("lamp", material="Light")
     points, triangles = icosphere(1)
     for triangle in triangles:
         corners = [points[i] for i in triangle]
@@ -358,7 +533,7 @@ def lantern_roof():
 
 
 def finial():
-    mesh = Mesh("finial")
+    mesh = Mesh("finial", material="Metal")
     rings = [ring(6, r, y) for r, y in ((0.05, 0), (0.05, 0.25), (0.17, 0.38), (0.03, 0.55))]
     for lower, upper in zip(rings, rings[1:]):
         mesh.band(lower, upper, colour("brass"), colour("brass", 1.2))
@@ -413,31 +588,29 @@ def door():
 
 
 def cottage_walls():
-    mesh = Mesh("cottage_walls", textured=True)
+    mesh = Mesh("cottage_walls")
     paint, foot = colour("cream"), colour("cream", 0.75)
     for sign in (1, -1):
         x, z = 1.7 * sign, 1.2 * sign
         side = [(-x, 0, z), (x, 0, z), (x, 1.6, z), (-x, 1.6, z)]
-        mesh.face(side, [foot, foot, paint, paint], [(0, 0), (3.4, 0), (3.4, 1.6), (0, 1.6)])
+        mesh.face(side, [foot, foot, paint, paint])
         gable = [(x, 0, z), (x, 0, -z), (x, 1.6, -z), (x, 2.75, 0), (x, 1.6, z)]
-        mesh.face(gable, [foot, foot, paint, paint, paint],
-                  [(0, 0), (2.4, 0), (2.4, 1.6), (1.2, 2.75), (0, 1.6)])
+        mesh.face(gable, [foot, foot, paint, paint, paint])
     return mesh
 
 
 def cottage_roof():
     """Two thick slabs; their ends together are one concave polygon."""
-    mesh = Mesh("cottage_roof", textured=True)
+    mesh = Mesh("cottage_roof")
     end = [(-1.5, 1.35), (-1.5, 1.2), (0, 2.65), (1.5, 1.2), (1.5, 1.35), (0, 2.95)]
     paints = ["wood", "wood", "wood", "wood", "roof", "roof"]
     n = len(end)
     for i in range(n):
         (az, ay), (bz, by) = end[i], end[(i + 1) % n]
-        paint = colour(paints[i])
-        mesh.face([(-2.0, ay, az), (2.0, ay, az), (2.0, by, bz), (-2.0, by, bz)], paint,
-                  [(0, 0), (4, 0), (4, 2), (0, 2)])
+        mesh.face([(-2.0, ay, az), (2.0, ay, az), (2.0, by, bz), (-2.0, by, bz)],
+                  colour(paints[i]))
     for x, points in ((2.0, end[::-1]), (-2.0, end)):
-        mesh.face([(x, y, z) for z, y in points], colour("wood"), [(z, y) for z, y in points])
+        mesh.face([(x, y, z) for z, y in points], colour("wood"))
     return mesh
 
 
@@ -487,8 +660,17 @@ def stepping_stone():
     return mesh
 
 
+def sign_board():
+    """Two sides, each with the whole picture; looks along +Z."""
+    mesh = Mesh("sign_board", material="Signboard")
+    front = [(-0.8, 0, 0.02), (0.8, 0, 0.02), (0.8, 0.6, 0.02), (-0.8, 0.6, 0.02)]
+    for side in (front, [(-x, y, -z) for x, y, z in front]):
+        mesh.face(side, (1, 1, 1), [(0, 0), (1, 0), (1, 1), (0, 1)])
+    return mesh
+
+
 def pier():
-    mesh = Mesh("pier", textured=True)
+    mesh = Mesh("pier")
     for k in range(9):
         z = 0.5 * k
         mesh.box((-0.55, 0.4, z), (0.55, 0.48, z + 0.42), colour("wood", 0.85),
@@ -521,7 +703,7 @@ def boat_hull():
 
 
 def boat_rig():
-    """A mast with a boom and two sails; the sails have two sides."""
+    """A mast with a boom and two sails; the sails have two sides, a little apart."""
     mesh = Mesh("boat_rig")
     mesh.band(ring(6, 0.05, 0.3), ring(6, 0.03, 3.2), colour("wood"), colour("wood_light"))
     mesh.cone(ring(6, 0.03, 3.2), (0, 3.3, 0), colour("wood_light"), colour("red"))
@@ -529,7 +711,7 @@ def boat_rig():
     for sail in ([(-0.06, 0.85, 0), (-0.06, 3.1, 0), (-1.2, 0.85, 0.12)],
                  [(0.06, 2.8, 0), (0.06, 0.8, 0), (1.35, 0.65, 0.1)]):
         mesh.face(sail, colour("sail"))
-        mesh.face(sail[::-1], colour("sail", 0.9))
+        mesh.face([(x, y, z - 0.02) for x, y, z in sail[::-1]], colour("sail", 0.9))
     return mesh
 
 
@@ -557,6 +739,7 @@ def polar(radius, degrees, y=0.0):
 def add_lantern(gallery):
     lantern = gallery.add("Lantern", (0, 0.16, 0))
     lantern.add("Lantern_Wall", mesh="lantern_wall")
+    lantern.add("Lantern_Glass", mesh="lantern_glass")
     lantern.add("Lamp", (0, 1.0, 0), mesh="lamp")
     mullions = lantern.add("Mullions", (0, 0.5, 0))
     for k in range(8):
@@ -651,6 +834,13 @@ def add_fence_and_path(island):
                      scale=(math.hypot(dx, dz), 1, 1), mesh="fence_rail")
 
 
+def add_sign(island):
+    sign = island.add("Sign", (4.3, GROUND, 2.7), 45)
+    for k, x in enumerate((-0.6, 0.6)):
+        sign.add(f"Sign_Post_{k + 1}", (x, 0, 0), scale=(1, 1.2, 1), mesh="fence_post")
+    sign.add("Sign_Board", (0, 0.45, 0.08), mesh="sign_board")
+
+
 def add_harbour(root):
     harbour = root.add("Harbour", polar(4.9, -53), 37)
     harbour.add("Pier", mesh="pier")
@@ -679,15 +869,16 @@ def scene():
     add_plants(island)
     add_rocks(island)
     add_fence_and_path(island)
+    add_sign(island)
     add_harbour(root)
     return root
 
 
 def meshes():
     makers = (sea, beach, meadow, gear_base, tower_shaft, gallery_floor, gallery_rail,
-              lantern_wall, lamp, lantern_roof, finial, window, door, cottage_walls, cottage_roof,
-              chimney, pine, trunk, fence_post, fence_rail, stepping_stone, pier, pile, boat_hull,
-              boat_rig)
+              lantern_wall, lantern_glass, lamp, lantern_roof, finial, window, door, cottage_walls,
+              cottage_roof, chimney, pine, trunk, fence_post, fence_rail, stepping_stone,
+              sign_board, pier, pile, boat_hull, boat_rig)
     result = [make() for make in makers]
     result.append(lump("crown", 1, (0.95, 0.85, 0.95), 0.12, 21, colour("leaf"),
                        colour("leaf_light")))
@@ -704,6 +895,66 @@ def meshes():
 def number(value):
     text = f"{value:.4f}".rstrip("0").rstrip(".")
     return "0" if text == "-0" else text
+
+
+def write_image(picture):
+    yield f'    <image id="{picture.name}" name="{picture.name}">'
+    yield f"      <init_from>textures/{picture.name}.png</init_from>"
+    yield "    </image>"
+
+
+def write_effect(material):
+    def colour_element(name, values):
+        return f"            <{name}><color>{' '.join(map(number, values))} 1</color></{name}>"
+
+    def map_element(name, picture, attributes=""):
+        return (f'            <{name}{attributes}><texture texture="{picture}-sampler"'
+                f' texcoord="UV"/></{name}>')
+
+    def float_element(name, value):
+        return f"            <{name}><float>{number(value)}</float></{name}>"
+
+    yield f'    <effect id="{material.name}-effect">'
+    yield "      <profile_COMMON>"
+    for picture in material.maps():
+        yield (f'        <newparam sid="{picture}-surface"><surface type="2D"><init_from>{picture}'
+               "</init_from></surface></newparam>")
+        yield (f'        <newparam sid="{picture}-sampler"><sampler2D><source>{picture}-surface'
+               "</source></sampler2D></newparam>")
+    yield '        <technique sid="common">'
+    model = "phong" if material.shininess else "lambert"
+    yield f"          <{model}>"
+    if material.emission:
+        yield colour_element("emission", material.emission)
+    if material.occlusion_map:
+        yield map_element("ambient", material.occlusion_map)
+    if material.colour_map:
+        yield map_element("diffuse", material.colour_map)
+    else:
+        yield colour_element("diffuse", (1, 1, 1))
+    if material.shininess:
+        yield colour_element("specular", (0.5, 0.5, 0.5))
+        yield float_element("shininess", material.shininess)
+    if material.cut_out:
+        yield map_element("transparent", material.colour_map, ' opaque="A_ONE"')
+    elif material.opacity < 1:
+        yield '            <transparent opaque="A_ONE"><color>1 1 1 1</color></transparent>'
+        yield float_element("transparency", material.opacity)
+    yield f"          </{model}>"
+    if material.bump_map:
+        # COLLADA has no place for it; this one is known to many programs.
+        yield '          <extra><technique profile="FCOLLADA">'
+        yield map_element("bump", material.bump_map)
+        yield "          </technique></extra>"
+    yield "        </technique>"
+    yield "      </profile_COMMON>"
+    yield "    </effect>"
+
+
+def write_material(material):
+    yield f'    <material id="{material.name}" name="{material.name}">'
+    yield f'      <instance_effect url="#{material.name}-effect"/>'
+    yield "    </material>"
 
 
 def write_source(mesh, kind, params):
@@ -739,7 +990,7 @@ def write_mesh(mesh):
     yield "        </vertices>"
     sizes = [len(polygon) for polygon in mesh.polygons]
     element = "triangles" if max(sizes) == 3 else "polylist"
-    yield f'        <{element} count="{len(sizes)}">'
+    yield f'        <{element} material="surface" count="{len(sizes)}">'
     for offset, (semantic, kind, _) in enumerate(sources):
         count = ' set="0"' if semantic in ("TEXCOORD", "COLOR") else ""
         yield (f'          <input semantic="{semantic}" source="#{mesh.name}-{kind}"'
@@ -753,7 +1004,19 @@ def write_mesh(mesh):
     yield "    </geometry>"
 
 
-def write_node(node, indent):
+def write_instance(mesh, pad):
+    yield f'{pad}<instance_geometry url="#{mesh.name}">'
+    end = "/>"
+    if mesh.textured:
+        end = ('><bind_vertex_input semantic="UV" input_semantic="TEXCOORD" input_set="0"/>'
+               "</instance_material>")
+    yield (f"{pad}  <bind_material><technique_common>"
+           f'<instance_material symbol="surface" target="#{mesh.material}"{end}'
+           "</technique_common></bind_material>")
+    yield f"{pad}</instance_geometry>"
+
+
+def write_node(node, mesh_named, indent):
     pad = " " * indent
     yield f'{pad}<node id="{node.name}" name="{node.name}" type="NODE">'
     if node.matrix:
@@ -765,13 +1028,21 @@ def write_node(node, indent):
     if node.scale:
         yield f"{pad}  <scale>{' '.join(map(number, node.scale))}</scale>"
     if node.mesh:
-        yield f'{pad}  <instance_geometry url="#{node.mesh}"/>'
+        yield from write_instance(mesh_named[node.mesh], pad + "  ")
     for child in node.children:
-        yield from write_node(child, indent + 2)
+        yield from write_node(child, mesh_named, indent + 2)
     yield f"{pad}</node>"
 
 
-def write_document():
+def write_library(kind, items, write_item):
+    yield f"  <library_{kind}>"
+    for item in items:
+        yield from write_item(item)
+    yield f"  </library_{kind}>"
+
+
+def write_document(images):
+    parts = meshes()
     yield '<?xml version="1.0" encoding="utf-8"?>'
     yield '<COLLADA xmlns="http://www.collada.org/2005/11/COLLADASchema" version="1.4.1">'
     yield "  <asset>"
@@ -781,19 +1052,30 @@ def write_document():
     yield '    <unit name="meter" meter="1"/>'
     yield "    <up_axis>Y_UP</up_axis>"
     yield "  </asset>"
-    yield "  <library_geometries>"
-    for mesh in meshes():
-        yield from write_mesh(mesh)
-    yield "  </library_geometries>"
+    yield from write_library("images", images, write_image)
+    yield from write_library("effects", MATERIALS.values(), write_effect)
+    yield from write_library("materials", MATERIALS.values(), write_material)
+    yield from write_library("geometries", parts, write_mesh)
     yield "  <library_visual_scenes>"
     yield '    <visual_scene id="Scene" name="Scene">'
-    yield from write_node(scene(), 6)
+    yield from write_node(scene(), {mesh.name: mesh for mesh in parts}, 6)
     yield "    </visual_scene>"
     yield "  </library_visual_scenes>"
     yield '  <scene><instance_visual_scene url="#Scene"/></scene>'
     yield "</COLLADA>"
 
 
+def main(arguments):
+    if len(arguments) > 1:
+        sys.exit("usage: make_lighthouse.py [FOLDER]")
+    folder = pathlib.Path(arguments[0]) if arguments else pathlib.Path(__file__).parent
+    (folder / "textures").mkdir(parents=True, exist_ok=True)
+    images = pictures()
+    for picture in images:
+        (folder / "textures" / f"{picture.name}.png").write_bytes(picture.encoded())
+    text = "".join(f"{line}\n" for line in write_document(images))
+    (folder / "lighthouse.dae").write_bytes(text.encode())
+
+
 if __name__ == "__main__":
-    for line in write_document():
-        print(line)
+    main(sys.argv[1:])

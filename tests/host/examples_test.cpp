@@ -3,6 +3,10 @@
 
 #include "support/gltf_reader.h"
 
+#include <rapidjson/pointer.h>
+
+#include <map>
+
 namespace host_test {
 namespace {
 
@@ -14,6 +18,68 @@ std::vector<double> positionsOf(const std::string& path) {
     const test_support::Primitive primitive = file.primitive(0, 0);
     EXPECT_FALSE(primitive.compressed);
     return primitive.attributes.at("POSITION").values;
+}
+
+/// What there is to a material, in words: how it is blended, whether it glows, and the kinds of
+/// picture that its slots show.
+std::string traitsOf(const rapidjson::Value& material, const test_support::GltfFile& file) {
+    std::string traits;
+    if (material.HasMember("alphaMode"))
+        traits += std::string(material["alphaMode"].GetString()) + " ";
+    if (material.HasMember("emissiveFactor") && material["emissiveFactor"][0].GetDouble() > 0)
+        traits += "glows ";
+    const char* const slots[] = {"/pbrMetallicRoughness/baseColorTexture",
+                                 "/pbrMetallicRoughness/metallicRoughnessTexture", "/normalTexture",
+                                 "/occlusionTexture", "/emissiveTexture"};
+    for (const std::string slot : slots) {
+        const auto* texture = rapidjson::Pointer((slot + "/index").c_str()).Get(material);
+        if (!texture)
+            continue;
+        const auto& source = file.element("textures", texture->GetUint())["source"];
+        const auto& image = file.element("images", source.GetUint());
+        const bool isPng = file.bufferView(image["bufferView"].GetUint())[1] == 'P';
+        EXPECT_STREQ(image["mimeType"].GetString(), isPng ? "image/png" : "image/jpeg");
+        traits += slot.substr(slot.rfind('/') + 1) + (isPng ? "=png " : "=jpeg ");
+    }
+    return traits;
+}
+
+TEST_F(ExamplesTest, LighthouseHasMaterialsAndPictures) {
+    const std::string model = SOURCE_FOLDER "/examples/lighthouse.dae";
+    EXPECT_EQ(runReal({"--strict", model, "@/a.glb"}).err, "");
+    const auto file = test_support::GltfFile::read(path("@/a.glb"));
+    std::map<std::string, std::string> traits;
+    for (const auto& material : file.json()["materials"].GetArray())
+        traits.emplace(material["name"].GetString(), traitsOf(material, file));
+    const std::map<std::string, std::string> expected = {
+        {"Glass", "BLEND "},
+        {"Light", "glows "},
+        {"Masonry", "baseColorTexture=jpeg normalTexture=jpeg occlusionTexture=jpeg "},
+        {"Metal", ""},
+        {"Paint", ""},
+        {"Signboard", "BLEND baseColorTexture=png "},
+        {"Water", "normalTexture=jpeg "}};
+    EXPECT_EQ(traits, expected);
+    EXPECT_EQ(file.count("materials"), expected.size());
+    EXPECT_EQ(file.count("images"), 5u);
+}
+
+TEST_F(ExamplesTest, LighthouseIsWhatItsScriptWrites) {
+    namespace fs = std::filesystem;
+    const fs::path examples = SOURCE_FOLDER "/examples";
+    const Outcome outcome =
+        runProgram("/usr/bin/env", {"python3", examples / "make_lighthouse.py", path("@/written")});
+    if (outcome.exitCode == 127)
+        GTEST_SKIP() << "no Python";
+    EXPECT_EQ(outcome.exitCode, 0) << outcome.err;
+    EXPECT_EQ(readFile(path("@/written/lighthouse.dae")), readFile(examples / "lighthouse.dae"));
+    std::size_t count = 0;
+    for (const auto& entry : fs::directory_iterator(examples / "textures")) {
+        const fs::path written = path("@/written/textures") / entry.path().filename();
+        EXPECT_EQ(readFile(written), readFile(entry.path())) << written;
+        ++count;
+    }
+    EXPECT_EQ(count, 5u);
 }
 
 TEST_F(ExamplesTest, HostWritesItsTriangle) {
