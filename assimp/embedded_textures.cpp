@@ -1,7 +1,6 @@
 #include "assimp/embedded_textures.h"
 
 #include "assimp/library_text.h"
-#include "assimp/picture_decoding.h"
 #include "assimp/picture_folder.h"
 
 #include "b_exception.h"
@@ -13,6 +12,7 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstring>
+#include <span>
 
 namespace assimp {
 
@@ -34,14 +34,12 @@ string writeCompressed(const aiTexture& texture, const string& name, PictureFold
     const string_view hint(texture.achFormatHint,
                            strnlen(texture.achFormatHint, sizeof texture.achFormatHint));
     const string named = fs::extension(name);
-    const PictureKind kind = kindOf(bytes, named.empty() ? hint : string_view(named));
-    if (const base::ref<iio::Image> readable = makeReadable(bytes, kind, name))
-        return folder.add(fs::stem(name), *readable);
-    return folder.add(fs::stem(name), extensionOf(kind), bytes);
+    return folder.addReadable(fs::stem(name), bytes,
+                              kindOf(bytes, named.empty() ? hint : string_view(named)));
 }
 
-/// Texels that are not in a format of their own. Of formats that know no alpha they come with one
-/// of 0 as well as of 255.
+/// Texels that are not in a format of their own. Of formats that know no alpha they may come with
+/// one of 0 everywhere.
 string writeTexels(const aiTexture& texture, const string& name, PictureFolder& folder) {
     const u64 count = u64(texture.mWidth) * texture.mHeight;
     if (count > (u64(1) << 26))
@@ -54,9 +52,8 @@ string writeTexels(const aiTexture& texture, const string& name, PictureFolder& 
     static_assert(sizeof(aiTexel) == 4 && offsetof(aiTexel, b) == 0 && offsetof(aiTexel, a) == 3);
     std::memcpy(image->data(), texture.pcData, image->memorySize());
     const std::span texels(texture.pcData, count);
-    const bool isPlain =
-        std::ranges::all_of(texels, [](const aiTexel& texel) { return texel.a == 0; });
-    image = isPlain ? image->convertFormat(iio::Image::kRGB) : withoutOpaqueAlpha(image);
+    if (std::ranges::all_of(texels, [](const aiTexel& texel) { return texel.a == 0; }))
+        image = image->convertFormat(iio::Image::kRGB);
     return folder.add(fs::stem(name), *image);
 }
 

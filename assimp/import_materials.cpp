@@ -2,6 +2,8 @@
 
 #include "b_log.h"
 #include "b_string_convert.h"
+#include "b_vector_math.h"
+#include "scene_mesh.h"
 #include "stream/b_fs.h"
 
 #include <assimp/material.h>
@@ -42,9 +44,6 @@ bool isAmong(string_view text, std::initializer_list<string_view> texts) {
     return std::ranges::find(texts, text) != texts.end();
 }
 
-vec3f scaled(const vec3f& color, float factor) {
-    return {color.x * factor, color.y * factor, color.z * factor};
-}
 vec3f clamped(const vec3f& color) {
     return {std::clamp(color.x, 0.0f, 1.0f), std::clamp(color.y, 0.0f, 1.0f),
             std::clamp(color.z, 0.0f, 1.0f)};
@@ -188,10 +187,8 @@ void MaterialMaker::writeColor(const TextureSlot& colorMap) {
 /// files name one picture as both then.
 void MaterialMaker::writeTransparency(const TextureSlot& colorMap) {
     float opacity = readOpacity();
-    const string_view opacityMap =
-        properties_.readText({AI_MATKEY_TEXTURE(aiTextureType_OPACITY, 0)});
-    if (!opacityMap.empty()) {
-        faults_.opacityMaps += opacityMap != colorMap.path;
+    if (const TextureSlot opacityMap = firstMap({aiTextureType_OPACITY})) {
+        faults_.opacityMaps += opacityMap.source != colorMap.source;
         if (format_.mapsReplace)
             opacity = 1;
     }
@@ -250,7 +247,10 @@ TextureSlot MaterialMaker::readRoughnessMap() {
     gloss.path = properties_.readText({AI_MATKEY_TEXTURE(aiTextureType_SHININESS, 0)});
     if (isNamed(gloss, {"rough"}))
         return firstMap({aiTextureType_SHININESS});
-    faults_.glossMaps += !gloss.path.empty();
+    if (!gloss.path.empty()) {
+        ++faults_.glossMaps;
+        textures_.mention(gloss.path);
+    }
     return {};
 }
 
@@ -315,7 +315,7 @@ void MaterialMaker::writeEmission() {
         color = mappedColor(color);
     else if (!map.path.empty() && format_.mapsReplace)
         color = black; // the color says nothing, and the surface shall not glow all over
-    color = clamped(scaled(color, readNumber({AI_MATKEY_EMISSIVE_INTENSITY}).value_or(1)));
+    color = clamped(color * readNumber({AI_MATKEY_EMISSIVE_INTENSITY}).value_or(1));
     if (color != black)
         write(object_, Material::n_emission) = color;
     writeMap(Material::n_emissionMap, map, channelsWhole);
@@ -339,9 +339,15 @@ bool hasTextures(const aiMaterial& material) {
     return false;
 }
 
+/// True if the object has a set of texture coordinates that exporters take.
+bool hasCoordinates(const base::AttribMap& object) {
+    const base::AttribMap* set = findListItem(object, scene::mesh_schema::n_uvSets, 0);
+    return set && find(*set, scene::meshUVSet_schema::n_UV);
+}
+
 /// True for the material that readers make where a file has none: without a name of its own and
 /// with nothing but one of their greys.
-bool isMadeUp(const aiMaterial& material) {
+bool isDefaultMaterial(const aiMaterial& material) {
     const MaterialProperties properties(material);
     const string_view name = properties.readText({AI_MATKEY_NAME});
     if ((!name.empty() && name != AI_DEFAULT_MATERIAL_NAME) || hasTextures(material))
@@ -382,7 +388,7 @@ void MaterialFaults::report(const string& path) const {
     tell(base::logInformation, glossMaps, "assimp |{}| Left out {} gloss maps.");
     tell(base::logInformation, metalWithoutMap,
          "assimp |{}| Found {} metals without a map, which can't be told from other materials.");
-    tell(base::logInformation, placedTextures,
+    tell(base::logInformation, transformedTextures,
          "assimp |{}| Found {} textures with a transform or projection, which is left out.");
 }
 
@@ -399,8 +405,7 @@ MaterialImport::MaterialImport(const aiScene& source, const string& path,
 
 void MaterialImport::assign(const aiMesh& mesh, const GeometryObjects& objects) {
     for (const base::ref<base::IPlugin>& object : objects) {
-        const base::AttribArray* sets = find(*object, scene::mesh_schema::n_uvSets);
-        const base::ref<base::IPlugin> material = materialOf(mesh, sets && sets->size() != 0);
+        const base::ref<base::IPlugin> material = materialOf(mesh, hasCoordinates(*object));
         if (!material)
             continue;
         if (object->typeName() == scene::lines_schema::n_kind)
@@ -412,15 +417,15 @@ void MaterialImport::assign(const aiMesh& mesh, const GeometryObjects& objects) 
     }
 }
 
-base::ref<base::IPlugin> MaterialImport::materialOf(const aiMesh& mesh, bool hasCoordinates) {
+base::ref<base::IPlugin> MaterialImport::materialOf(const aiMesh& mesh, bool isMappable) {
     const aiMaterial* source = mesh.mMaterialIndex < source_.mNumMaterials
                                    ? source_.mMaterials[mesh.mMaterialIndex]
                                    : nullptr;
     if (!source)
         return nullptr;
-    const bool isMapped = hasCoordinates && hasTextures(*source);
+    const bool isMapped = isMappable && hasTextures(*source);
     const auto [at, isNew] = materials_.try_emplace(std::pair(mesh.mMaterialIndex, isMapped));
-    if (!isNew || isMadeUp(*source))
+    if (!isNew || isDefaultMaterial(*source))
         return at->second;
     at->second = factory_.create(Material::n_kind);
     MaterialMaker(*source, mesh, isMapped, format_, textures_, faults_, *at->second).run();
@@ -429,8 +434,12 @@ base::ref<base::IPlugin> MaterialImport::materialOf(const aiMesh& mesh, bool has
 
 MaterialFaults MaterialImport::faults() const {
     MaterialFaults faults = faults_;
-    faults.placedTextures = textures_.placedCount();
+    faults.transformedTextures = textures_.transformedCount();
     return faults;
+}
+
+base::vector<string> MaterialImport::pictureFiles() const {
+    return textures_.foundFiles();
 }
 
 base::ref<base::IPlugin> MaterialImport::pictures() const {

@@ -28,7 +28,7 @@ struct MaterialFaults {
     base::u64 opacityMaps = 0;
     base::u64 glossMaps = 0;
     base::u64 metalWithoutMap = 0;
-    base::u64 placedTextures = 0;
+    base::u64 transformedTextures = 0;
 
     /// Logs one line for each kind that occurred.
     void report(const base::string& path) const;
@@ -47,12 +47,14 @@ public:
     void assign(const aiMesh& mesh, const GeometryObjects& objects);
 
     MaterialFaults faults() const;
+    /// All picture files that the materials name.
+    base::vector<base::string> pictureFiles() const;
     /// The files that were made of textures; null if there are none. They must live as long as
     /// the scene.
     base::ref<base::IPlugin> pictures() const;
 
 private:
-    base::ref<base::IPlugin> materialOf(const aiMesh& mesh, bool hasCoordinates);
+    base::ref<base::IPlugin> materialOf(const aiMesh& mesh, bool isMappable);
 
     const aiScene& source_;
     base::PluginFactory& factory_;

@@ -42,7 +42,7 @@ Enumeration readWrap(const MaterialProperties& material, const PropertyKey& key)
 }
 
 /// True if the texture is not laid out by texture coordinates as they are.
-bool isPlaced(const MaterialProperties& material, unsigned type) {
+bool isTransformed(const MaterialProperties& material, unsigned type) {
     constexpr std::array<float, 5> identity = {0, 0, 1, 1, 0}; // translation, scale, angle
     std::array<float, 5> transform = identity;
     material.read({AI_MATKEY_UVTRANSFORM(type, 0)}, transform);
@@ -87,7 +87,7 @@ TextureSlot TextureImport::read(const MaterialProperties& material, unsigned typ
     slot.wrapV = readWrap(material, {AI_MATKEY_MAPPINGMODE_V(type, 0)});
     slot.channel =
         static_cast<base::u32>(std::max(material.readInt({AI_MATKEY_UVWSRC(type, 0)}, 0), 0));
-    placedCount_ += slot && isPlaced(material, type);
+    transformedCount_ += slot && isTransformed(material, type);
     return slot;
 }
 
@@ -99,58 +99,69 @@ const PictureFile& TextureImport::findFile(const string& path, string_view mater
 }
 
 PictureFile TextureImport::searchFile(const string& path, string_view material) {
-    if (const aiTexture* embedded = findEmbedded(source_, path))
-        return {makeFile(path, material, {},
-                         [&] { return writeEmbedded(*embedded, path, *pictures_); }),
-                modelPath_};
+    const auto make = [&](string& made, const auto& makeFile) {
+        try {
+            made = makeFile();
+        } catch (const std::exception& e) {
+            base::log().log(base::logScene, base::logWarning,
+                            "assimp |{}| The texture '{}' is left out! {}", material, path,
+                            e.what());
+        }
+        return made;
+    };
+    if (const aiTexture* embedded = findEmbedded(source_, path)) {
+        const auto [at, isNew] = embeddedFiles_.try_emplace(embedded);
+        if (isNew)
+            make(at->second, [&] { return writeEmbedded(*embedded, path, *pictures_); });
+        return {at->second, modelPath_};
+    }
     vector<string> tried;
-    const string file = search_.find(path, tried);
-    if (!file.empty())
-        return {readableFile(file, material), file};
+    const string file = findPicture(path, tried);
+    if (!file.empty()) {
+        const auto [at, isNew] = readableFiles_.try_emplace(file);
+        if (isNew)
+            make(at->second, [&] { return readableFile(file); });
+        return {at->second, file};
+    }
     base::log().log(base::logScene, base::logWarning,
                     "assimp |{}| Unable to find the texture '{}', it is left out! Tried: {}",
                     material, path, joinedList(tried));
     return {};
 }
 
-/// The file that `make` makes of a picture; `otherwise`, with a warning, if that fails.
-template <class Make>
-string TextureImport::makeFile(const string& path, string_view material, const string& otherwise,
-                               const Make& make) {
-    string reason;
-    try {
-        return make();
-    } catch (const std::exception& e) {
-        reason = e.what();
-    }
-    base::log().log(base::logScene, base::logWarning, "assimp |{}| The texture '{}' is {}! {}",
-                    material, path, otherwise.empty() ? "left out" : "taken as it is", reason);
-    return otherwise;
+/// The absolute path of a picture file, empty if it is not found: exporters look for relative ones
+/// elsewhere first.
+string TextureImport::findPicture(const string& path, vector<string>& tried) {
+    const string file = search_.find(path, tried);
+    return file.empty() ? file : fs::normalized(fs::joined(fs::master().curdir(), file));
+}
+
+void TextureImport::mention(const string& path) {
+    vector<string> tried;
+    if (const string file = findPicture(path, tried); !file.empty())
+        mentionedFiles_.push_back(file);
+}
+
+vector<string> TextureImport::foundFiles() const {
+    vector<string> files = mentionedFiles_;
+    for (const auto& [file, readable] : readableFiles_)
+        files.push_back(file);
+    return files;
 }
 
 /// The file, or one of what exporters should read in its place: what they can't read, or not under
-/// its name, would make the document invalid.
-string TextureImport::readableFile(const string& file, string_view material) {
-    string otherwise; // a picture that can't be read is left out
-    return makeFile(file, material, otherwise, [&] {
-        base::Stream stream;
-        fs::master().open(stream, file, base::fs::openRead);
-        const Bytes start = readBytes(stream, headerLength);
-        const PictureKind kind = kindOf({start.data(), start.size()}, fs::extension(file));
-        const bool isRightlyNamed = isNamed(kind, fs::extension(file));
-        if (isRightlyNamed && !isDoubtful(stream, kind))
-            return file;
-        const Bytes bytes = readBytes(stream, greatestFile);
-        const base::ref<iio::Image> readable =
-            makeReadable({bytes.data(), bytes.size()}, kind, file);
-        if (isRightlyNamed)
-            otherwise = file; // only the folder for files can fail from here on
-        if (readable)
-            return pictures_->add(fs::stem(file), *readable);
-        return isRightlyNamed ? file
-                              : pictures_->add(fs::stem(file), extensionOf(kind),
-                                               {bytes.data(), bytes.size()});
-    });
+/// its name, would make the document invalid. Throws `base::exception` for what nobody can read.
+string TextureImport::readableFile(const string& file) {
+    base::Stream stream;
+    fs::master().open(stream, file, base::fs::openRead);
+    const Bytes start = readBytes(stream, headerLength);
+    const PictureKind kind = kindOf({start.data(), start.size()}, fs::extension(file));
+    if (mayHaveExtension(kind, fs::extension(file))) {
+        checkPicture(stream, kind);
+        return file;
+    }
+    const Bytes bytes = readBytes(stream, greatestFile);
+    return pictures_->addReadable(fs::stem(file), {bytes.data(), bytes.size()}, kind);
 }
 
 base::ref<base::IPlugin> TextureImport::create(const TextureSlot& slot, Enumeration channels,
@@ -164,6 +175,7 @@ base::ref<base::IPlugin> TextureImport::create(const TextureSlot& slot, Enumerat
     texture = factory_.create(Schema::n_kind);
     write(*texture, scene::texture_schema::n_name) = fs::stem(slot.file);
     write(*texture, Schema::n_file) = slot.file;
+    scene::setIgnoresOpaqueAlpha(*texture);
     if (slot.source != slot.file)
         scene::setPictureSource(*texture, slot.source);
     if (!set.empty())

@@ -10,6 +10,7 @@
 
 struct aiMesh;
 struct aiScene;
+struct aiTexture;
 
 namespace assimp {
 
@@ -44,8 +45,13 @@ public:
     base::ref<base::IPlugin> create(const TextureSlot& slot, scene::Enumeration channels,
                                     const aiMesh& mesh);
 
+    /// Looks for a picture that is not shown: it counts as a file of the model all the same.
+    void mention(const base::string& path);
+
+    /// The files of all pictures that were found.
+    base::vector<base::string> foundFiles() const;
     /// Uses of textures with a transform or projection that textures here have not.
-    base::u64 placedCount() const { return placedCount_; }
+    base::u64 transformedCount() const { return transformedCount_; }
     /// The pictures that files were made of.
     const base::ref<PictureFolder>& pictures() const { return pictures_; }
 
@@ -55,10 +61,8 @@ private:
 
     const PictureFile& findFile(const base::string& path, base::string_view material);
     PictureFile searchFile(const base::string& path, base::string_view material);
-    template <class Make>
-    base::string makeFile(const base::string& path, base::string_view material,
-                          const base::string& otherwise, const Make& make);
-    base::string readableFile(const base::string& file, base::string_view material);
+    base::string readableFile(const base::string& file);
+    base::string findPicture(const base::string& path, base::vector<base::string>& tried);
 
     const aiScene& source_;
     base::PluginFactory& factory_;
@@ -66,8 +70,12 @@ private:
     TextureSearch search_;
     base::ref<PictureFolder> pictures_ = base::makeRef<PictureFolder>();
     base::map<base::string, PictureFile> files_; ///< by the path in the model
+    /// What exporters read in the place of a picture; empty for one that nobody can read.
+    base::map<base::string, base::string> readableFiles_;
+    base::map<const aiTexture*, base::string> embeddedFiles_;
+    base::vector<base::string> mentionedFiles_;
     base::map<Key, base::ref<base::IPlugin>> textures_;
-    base::u64 placedCount_ = 0;
+    base::u64 transformedCount_ = 0;
 };
 
 } // namespace assimp

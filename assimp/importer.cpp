@@ -9,6 +9,7 @@
 
 #include "b_log.h"
 #include "b_string_convert.h"
+#include "scene_image_record.h"
 #include "scene_schema.h"
 #include "stream/b_fs.h"
 
@@ -238,8 +239,11 @@ bool AssimpImporter::load(base::PluginFactory& scene, const base::string& path) 
     write(*object, Schema::n_root) = std::move(root);
     if (axes.upAxis != Schema::n_upAxis.defaultValue)
         write(*object, Schema::n_upAxis) = axes.upAxis;
-    if (materials && materials->pictures())
-        keep(*object, materials->pictures());
+    if (materials) {
+        scene::setPictureFiles(*object, materials->pictureFiles());
+        if (materials->pictures())
+            keep(*object, materials->pictures());
+    }
     return true;
 }
 

@@ -1,10 +1,12 @@
 #include "assimp/picture_folder.h"
 
+#include "assimp/picture_decoding.h"
 #include "b_exception.h"
 #include "b_format.h"
 #include "b_string_convert.h"
 #include "i_file.h"
 #include "stream/b_fs.h"
+#include "stream/b_stream_workers.h"
 
 #include <algorithm>
 
@@ -38,6 +40,10 @@ void writeFile(const string& path, std::span<const base::u8> bytes) {
     stream.write(bytes.data(), bytes.size());
 }
 
+[[noreturn]] void fail(const char* reason, int line) {
+    throw base::exception(reason, "picture_folder", "assimp::PictureFolder", line);
+}
+
 } // namespace
 
 string PictureFolder::newPath(string_view name, string_view extension) {
@@ -60,13 +66,25 @@ string PictureFolder::add(string_view name, string_view extension,
 
 string PictureFolder::add(string_view name, iio::Image& image) {
     string path = newPath(name, "png");
-    // Exporters will read it soon and make a file of their own.
-    base::AttribMap settings;
-    settings.attribute<base::i32>(iio::imageAttributes().n_CompressionLevel) = 1;
-    if (!iio::saveImage(image, path, settings))
-        throw base::exception("The picture could not be written.", "picture_folder",
-                              "assimp::PictureFolder::add", __LINE__);
+    if (!iio::saveImage(image, path))
+        fail("It can't be written.", __LINE__);
     return path;
+}
+
+string PictureFolder::addReadable(string_view name, std::span<const base::u8> bytes,
+                                  PictureKind kind) {
+    if (kind == PictureKind::unknown)
+        fail("It is in no format that can be read.", __LINE__);
+    if (kind != PictureKind::foreign) {
+        base::Stream file = base::memStreamView(bytes.data(), bytes.size(),
+                                                base::format("{}.{}", name, extensionOf(kind)));
+        checkPicture(file, kind);
+        return add(name, extensionOf(kind), bytes);
+    }
+    const base::ref<iio::Image> image = decodePicture(bytes);
+    if (!image)
+        fail("It can't be read.", __LINE__);
+    return add(name, *image);
 }
 
 } // namespace assimp

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "assimp/picture_kind.h"
 #include "b_factory.h"
 #include "i_image.h"
 #include "stream/b_temporary_folder.h"
@@ -23,6 +24,9 @@ public:
                      std::span<const base::u8> bytes);
     /// The same with a PNG file of `image`.
     base::string add(base::string_view name, iio::Image& image);
+    /// The same with the picture in `bytes`: as they are or, of a foreign format, as a PNG.
+    base::string addReadable(base::string_view name, std::span<const base::u8> bytes,
+                             PictureKind kind);
     bool isEmpty() const { return names_.empty(); }
 
 private:

@@ -1,11 +1,9 @@
 #include "gltf/exporter.h"
 #include "gltf/guarded.h"
-#include "gltf/prepare_image.h"
 #include "gltf/scene_kind.h"
 #include "gltf/vertex_array.h"
 
 #include "b_attribute_desc.h"
-#include "i_file.h"
 #include "scene_schema.h"
 #include "stream/b_fs.h"
 
@@ -68,14 +66,11 @@ void removeTemporary(const string& path) {
     });
 }
 
-} // namespace
-
 /// Turns one principal material into one of the document.
-class GLTFScenePlugin::MaterialConversion {
+class MaterialConversion {
 public:
-    MaterialConversion(GLTFScenePlugin& exporter, const IMaterial& material,
-                       const scene::IMesh* mesh)
-        : exporter_(exporter), material_(material), mesh_(mesh),
+    MaterialConversion(TextureExport& textures, const IMaterial& material, const scene::IMesh* mesh)
+        : textures_(textures), material_(material), mesh_(mesh),
           ambient_(findTexture(material, principalMaterial_schema::n_ambientMap)),
           rough_(findTexture(material, principalMaterial_schema::n_roughnessMap)) {}
 
@@ -87,7 +82,7 @@ public:
         setMetalRoughness();
         setNormalMap();
         if (usesOcclusion_)
-            result_->occlusionTexture = exporter_.buildTextureSlot(*ambient_, mesh_);
+            result_->occlusionTexture = textures_.buildTextureSlot(*ambient_, mesh_);
         if (model_ == 0 || model_ == 5)
             setEmission();
         if (!isFinite_)
@@ -117,7 +112,7 @@ private:
             return;
         bool hasAlpha = false;
         result_->metallicRoughness->baseColorTexture =
-            exporter_.buildTextureSlot(*map, mesh_, &hasAlpha);
+            textures_.buildTextureSlot(*map, mesh_, &hasAlpha);
         if (hasAlpha)
             result_->alphaMode = "BLEND";
     }
@@ -150,7 +145,7 @@ private:
         const bool isReady = metal ? rough_ && sameFileMetalRoughness(*metal, *rough_)
                                    : rough_ && readColorChannels(*rough_) == greenChannel;
         if (isReady)
-            target.metallicRoughnessTexture = exporter_.buildTextureSlot(*rough_, mesh_);
+            target.metallicRoughnessTexture = textures_.buildTextureSlot(*rough_, mesh_);
         else if (metal || rough_)
             target.metallicRoughnessTexture = buildPacked(metal);
     }
@@ -158,16 +153,16 @@ private:
     /// The slot of a picture made of the maps, which stands for occlusion too.
     Slot buildPacked(const ITexture* metal) {
         const string path =
-            exporter_.packOcclusionRoughnessMetal(result_->name, ambient_, metal, rough_);
+            textures_.packOcclusionRoughnessMetal(result_->name, ambient_, metal, rough_);
         if (path.empty())
             return nullptr;
         const ITexture& texture = metal ? *metal : rough_ ? *rough_ : *ambient_;
-        Slot slot = exporter_.buildTextureSlot(texture, mesh_, nullptr, path);
+        Slot slot = textures_.buildTextureSlot(texture, mesh_, nullptr, path);
         if (usesOcclusion_)
             result_->occlusionTexture = slot;
         usesOcclusion_ = false;
         if (slot)
-            exporter_.describeImage(*slot->texture->source, filesOf({ambient_, metal, rough_}),
+            textures_.describeImage(*slot->texture->source, filesOf({ambient_, metal, rough_}),
                                     ImageRecord::Work::packed);
         removeTemporary(path);
         return slot;
@@ -181,12 +176,12 @@ private:
             log().log(logScene, base::logWarning, "{}|Bump space is not supported by GLTF!",
                       material_.getName());
         const string path =
-            exporter_.isHeightMap(*map) ? exporter_.makeNormalMapFile(*map, material_) : string();
-        result_->normalTexture = exporter_.buildTextureSlot(*map, mesh_, nullptr, path);
+            textures_.isHeightMap(*map) ? textures_.makeNormalMapFile(*map, material_) : string();
+        result_->normalTexture = textures_.buildTextureSlot(*map, mesh_, nullptr, path);
         if (path.empty())
             return;
         if (result_->normalTexture)
-            exporter_.describeImage(*result_->normalTexture->texture->source, filesOf({map}),
+            textures_.describeImage(*result_->normalTexture->texture->source, filesOf({map}),
                                     ImageRecord::Work::normalMap);
         removeTemporary(path);
     }
@@ -195,20 +190,20 @@ private:
         const vec3f color = readColor(principalMaterial_schema::n_emission);
         result_->emissiveFactor = {color.x, color.y, color.z, 1};
         if (const ITexture* map = findTexture(material_, principalMaterial_schema::n_emissionMap))
-            result_->emissiveTexture = exporter_.buildTextureSlot(*map, mesh_);
+            result_->emissiveTexture = textures_.buildTextureSlot(*map, mesh_);
     }
 
     base::vector<string> filesOf(std::initializer_list<const ITexture*> textures) const {
         base::vector<string> files;
         for (const ITexture* texture : textures) {
-            string path = texture ? exporter_.sourceOf(*texture) : string();
+            string path = texture ? textures_.sourceOf(*texture) : string();
             if (!path.empty() && std::ranges::find(files, path) == files.end())
                 files.push_back(std::move(path));
         }
         return files;
     }
 
-    GLTFScenePlugin& exporter_;
+    TextureExport& textures_;
     const IMaterial& material_;
     const scene::IMesh* mesh_;
     const ITexture* ambient_;
@@ -219,6 +214,8 @@ private:
     const u8 model_ = principalMaterial_schema::n_model.defaultValue;
     ref<GLTF::MaterialPBR> result_ = base::makeRef<GLTF::MaterialPBR>();
 };
+
+} // namespace
 
 void GLTFScenePlugin::assignMaterial(GLTF::Primitive& primitive,
                                      const base::vector<scene::Object>& materials, u32 index,
@@ -242,22 +239,7 @@ ref<GLTF::Material> GLTFScenePlugin::buildMaterial(base::IPlugin& object,
     const auto* material = findClass<const IMaterial>(object);
     if (!material)
         return nullptr;
-    return MaterialConversion(*this, *material, mesh).convert();
-}
-
-/// True for a bump map that is no ready normal map: one that picks a channel, or has just one.
-bool GLTFScenePlugin::isHeightMap(const ITexture& map) const {
-    if (readColorChannels(map) >= 2)
-        return true;
-    const string path = resolveTexturePath(map);
-    bool hasOneChannel = false;
-    if (!path.empty())
-        guarded("Unable to load the bump map!", [&] {
-            iio::ImageInfo info;
-            hasOneChannel =
-                iio::readImageInfo(path, info) && iio::formatInfo(info.format).channelCount == 1;
-        });
-    return hasOneChannel;
+    return MaterialConversion(textures, *material, mesh).convert();
 }
 
 } // namespace gltf

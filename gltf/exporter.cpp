@@ -84,8 +84,9 @@ bool GLTFScenePlugin::exportScene(PluginFactory& sceneObjects, const string& pat
     const GLTF::Options options = makeOptions(path);
     const ref<GLTF::Asset> asset = makeAsset(gltfRoot);
     const ref<GLTF::Buffer> buffer = runPasses(*asset, options, gltfRoot);
-    writeOutputFiles(*asset, options, *buffer, findPictureFiles(), path);
-    storeImageRecords(*sceneObject, *asset);
+    writeOutputFiles(*asset, options, *buffer,
+                     textures.findPictureFiles(sceneObjects, *sceneObject), path);
+    scene::storeImageRecords(*sceneObject, textures.makeRecords(*asset));
     return true;
 }
 
@@ -132,31 +133,6 @@ ref<GLTF::Asset> GLTFScenePlugin::makeAsset(const ref<GLTF::Node>& gltfRoot) con
     return asset;
 }
 
-/// All files that pictures were read from.
-base::vector<string> GLTFScenePlugin::findPictureFiles() const {
-    base::vector<string> files;
-    for (const auto& [image, record] : imageRecords_)
-        files.append(record.sources.begin(), record.sources.end());
-    return files;
-}
-
-/// Leaves with the scene what became of its pictures.
-void GLTFScenePlugin::storeImageRecords(IPlugin& sceneObject, GLTF::Asset& asset) const {
-    base::vector<scene::ImageRecord> records;
-    for (const GLTF::Image* image : asset.getAllImages()) {
-        const auto known = imageRecords_.find(image);
-        if (known == imageRecords_.end())
-            continue;
-        scene::ImageRecord& record = records.emplace_back(known->second);
-        const GLTF::Image::Dimensions size = image->getDimensions();
-        record.name = image->uri;
-        record.width = size.width;
-        record.height = size.height;
-        record.byteLength = static_cast<u32>(image->byteLength);
-    }
-    scene::storeImageRecords(sceneObject, records);
-}
-
 void GLTFScenePlugin::clearTables() {
     GLTF::Image::clearCache();
     nodeMap.clear();
@@ -168,9 +144,7 @@ void GLTFScenePlugin::clearTables() {
     transformFaults_.clear();
     edgeMaterial_.reset();
     materialMap.clear();
-    preparedImages_.clear();
-    imageRecords_.clear();
-    temporaryFolder_.reset();
+    textures.clear();
 }
 
 } // namespace gltf

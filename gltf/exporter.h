@@ -1,17 +1,9 @@
 #pragma once
 
 #include "GLTF/document.h"
+#include "gltf/texture_export.h"
 #include "scene.h"
 #include "scene_factory.h"
-#include "scene_image_record.h"
-#include "stream/b_temporary_folder.h"
-
-#include <array>
-#include <optional>
-
-namespace iio {
-class Image;
-}
 
 /// The export plugin: turns the objects of a scene into a glTF document and writes its files.
 namespace gltf {
@@ -72,32 +64,6 @@ public:
                         base::u32 index, const scene::IMesh* mesh);
     /// A new material; null, silently, for all but exactly a `principalMaterial`.
     base::ref<GLTF::Material> buildMaterial(base::IPlugin& object, const scene::IMesh* mesh);
-    /// A new slot with the texture, null if that is null.
-    base::ref<GLTF::MaterialPBR::Texture> buildTextureSlot(const scene::ITexture& texture,
-                                                           const scene::IMesh* mesh,
-                                                           bool* hasAlpha = nullptr,
-                                                           const base::string& overridePath = {});
-    /// The texture of the document, the same for the same object; null for all but exactly a
-    /// `fileTexture` with a file. With `overridePath` a new one on that ready file, which is
-    /// removed. `hasAlpha` is set when the file is prepared, and left alone for a known texture.
-    base::ref<GLTF::Texture> buildTexture(const scene::ITexture& texture, bool* hasAlpha,
-                                          const base::string& overridePath);
-    /// Writes a temporary JPEG with occlusion, roughness and metal in red, green and blue, as
-    /// large as the largest map under the limit, and returns its path. Null maps, and those that
-    /// can't be read, are black. An empty path, with a message, if that fails.
-    base::string packOcclusionRoughnessMetal(const base::string& materialName,
-                                             const scene::ITexture* ambient,
-                                             const scene::ITexture* metal,
-                                             const scene::ITexture* rough);
-    /// The file of a texture, looked for in the folders of the settings if its path is relative;
-    /// empty without one.
-    base::string resolveTexturePath(const scene::ITexture& texture) const;
-    /// Raises `width` and `height` to those in which the texture is exported.
-    void largestExportSize(const scene::ITexture* texture, base::u32& width,
-                           base::u32& height) const;
-    /// The picture with the values of its file, null if there is none or it can't be read.
-    base::ref<iio::Image> loadTextureImage(const scene::ITexture* texture) const;
-
     /// The nodes of joints that the tree holds.
     base::hash_map<const scene::INode*, GLTF::Node*> nodeMap;
     // What each geometry became: shared ones are converted once. Null for what failed.
@@ -105,23 +71,14 @@ public:
     base::hash_map<const scene::ILines*, GLTF::Mesh*> linesMap;
     /// Null for what has no counterpart.
     base::hash_map<const base::IPlugin*, base::ref<GLTF::Material>> materialMap;
-    base::hash_map<const scene::ITexture*, base::ref<GLTF::Texture>> textureMap;
+    TextureExport textures{*this};
     base::u32 linesIndex = 0; ///< number of lines converted so far
 
 private:
-    class MaterialConversion;
-    /// What became of a picture file.
-    struct PreparedImage {
-        base::ref<GLTF::Image> image;
-        bool hasAlpha = false;
-    };
-
     void prepareObjects(base::PluginFactory& sceneObjects);
     base::ref<GLTF::Node> convertRoot(const scene::INode& root, base::u8 upAxis);
     GLTF::Options makeOptions(const base::string& path) const;
     base::ref<GLTF::Asset> makeAsset(const base::ref<GLTF::Node>& gltfRoot) const;
-    base::vector<base::string> findPictureFiles() const;
-    void storeImageRecords(base::IPlugin& sceneObject, GLTF::Asset& asset) const;
     void clearTables();
 
     base::mat43 findParentFromNode(const scene::INode& node, const TreePosition* parent);
@@ -137,17 +94,6 @@ private:
     void compressMesh(GLTF::Mesh& gltfMesh, const scene::IMesh& mesh);
     GLTF::Material* getEdgeMaterial(const scene::ILines& lines);
 
-    const base::string& temporaryFolder();
-    base::ref<GLTF::Image> buildImage(const scene::ITexture& texture, bool* hasAlpha);
-    base::string sourceOf(const scene::ITexture& texture) const;
-    base::ref<GLTF::Image> takeImage(const base::string& path);
-    bool isHeightMap(const scene::ITexture& map) const;
-    base::string makeNormalMapFile(const scene::ITexture& map, const scene::IMaterial& material);
-    base::ref<iio::Image> pack(const std::array<const scene::ITexture*, 3>& maps, base::u32 width,
-                               base::u32 height) const;
-    void describeImage(const GLTF::Image& image, base::vector<base::string> sources,
-                       scene::ImageRecord::Work work);
-
     /// Meshes that morph objects deform: their vertices must stay apart where the targets' do.
     base::set<const base::IPlugin*> morphBases_;
     /// The nodes with child nodes that the walk has met; true while it is below them.
@@ -156,9 +102,6 @@ private:
     /// What was logged of the transforms of nodes, each of which may be met at several places.
     base::hash_map<const scene::INode*, base::u32> transformFaults_;
     base::ref<GLTF::MaterialPBR> edgeMaterial_;
-    base::hash_map<base::string, PreparedImage> preparedImages_; ///< by the path of the file
-    base::hash_map<const GLTF::Image*, scene::ImageRecord> imageRecords_;
-    std::optional<base::fs::TemporaryFolder> temporaryFolder_; ///< made when first needed
 };
 
 /// A node of the scene at its place in the tree, which is known only during the walk.

@@ -27,18 +27,20 @@ string numbered(const string& uri, int number) {
 /// Which files are taken, and by the data of which image.
 class TakenFiles {
 public:
-    explicit TakenFiles(const string& folder)
-        : folder_(folder), current_(base::fs::master().curdir()) {}
+    TakenFiles(const string& folder, const SourceFiles& sources)
+        : folder_(folder), current_(base::fs::master().curdir()), sources_(sources) {}
 
-    /// A picture that was read must stay as it is. `image` has its data; null if no image has.
-    void addSource(const string& path, const Image* image) {
-        files_.try_emplace(keyOf(path), image);
-    }
+    void addOutput(const string& path) { files_.try_emplace(keyOf(path), nullptr); }
     /// True if the file of that uri is free for the image or holds the same data; it is taken
     /// then.
     bool take(const string& uri, const Image& image) {
-        const auto [entry, isNew] = files_.try_emplace(keyOf(folder_ + uri), &image);
-        return isNew || (entry->second && haveEqualData(*entry->second, image));
+        const string path = folder_ + uri;
+        if (const auto known = files_.find(keyOf(path)); known != files_.end())
+            return known->second && haveEqualData(*known->second, image);
+        if (sources_.contains(path) && !isSameFile(path, image.cacheKey))
+            return false;
+        files_[keyOf(path)] = &image;
+        return true;
     }
 
 private:
@@ -50,7 +52,8 @@ private:
 
     string folder_;
     string current_;
-    base::map<string, const Image*> files_;
+    const SourceFiles& sources_;
+    base::map<string, const Image*> files_; ///< null for what is no image
 };
 
 /// The images that wanted one uri which another one has.
@@ -80,15 +83,11 @@ private:
 
 } // namespace
 
-void makeUrisUnique(const base::vector<Image*>& images, const base::vector<string>& sources,
-                    const string& folder) {
-    TakenFiles taken(folder);
-    for (const Image* image : images) {
-        if (image->data && !image->cacheKey.empty())
-            taken.addSource(image->cacheKey, image);
-    }
-    for (const string& path : sources)
-        taken.addSource(path, nullptr);
+void makeUrisUnique(const base::vector<Image*>& images, const SourceFiles& sources,
+                    const base::vector<string>& otherOutputs, const string& folder) {
+    TakenFiles taken(folder, sources);
+    for (const string& path : otherOutputs)
+        taken.addOutput(path);
     base::map<string, Namesakes> namesakes;
     for (Image* image : images) {
         if (!image->data || taken.take(image->uri, *image))

@@ -6,7 +6,6 @@
 
 #include "stream/b_fs.h"
 
-#include <filesystem>
 #include <limits>
 
 namespace gltf {
@@ -182,20 +181,14 @@ void writeMainFile(Asset& asset, const GLTF::Options& options, const Buffer& buf
     });
 }
 
-/// True if `path` is the very file that the image was read from.
-bool isSource(const string& path, const Image& image) {
-    const base::fs::MasterFS& files = base::fs::master();
-    std::error_code error;
-    return !image.cacheKey.empty() &&
-           std::filesystem::equivalent(files.resolve(path), files.resolve(image.cacheKey), error);
-}
-
-void writeImages(const base::vector<Image*>& images, const string& folder) {
+/// A source may be the file of an image only if it holds the same: it stays as it is.
+void writeImages(const base::vector<Image*>& images, const SourceFiles& sources,
+                 const string& folder) {
     for (const Image* image : images) {
         const string path = folder + image->uri;
         if (image->data && image->byteLength > 0)
             guarded(imageMessage, [&] {
-                if (!isSource(path, *image))
+                if (!sources.contains(path))
                     writeFile(path, image->data, image->byteLength);
             });
         else
@@ -208,11 +201,11 @@ void writeImages(const base::vector<Image*>& images, const string& folder) {
 } // namespace
 
 void writeOutputFiles(Asset& asset, const GLTF::Options& options, Buffer& buffer,
-                      const base::vector<string>& sources, const string& path) {
+                      const SourceFiles& sources, const string& path) {
     const string folder = base::fs::folder(path);
     const base::vector<Image*> images = asset.getAllImages();
     if (!options.embedTextures)
-        makeUrisUnique(images, sources, folder);
+        makeUrisUnique(images, sources, {path, folder + buffer.uri}, folder);
     if (options.binary && options.version == "1.0")
         buffer.stringId = "binary_glTF";
 
@@ -220,7 +213,7 @@ void writeOutputFiles(Asset& asset, const GLTF::Options& options, Buffer& buffer
     if (!packsImages || guarded(mainFileMessage, [&] { packImages(images, buffer); }))
         writeMainFile(asset, options, buffer, path);
     if (!options.embedTextures)
-        writeImages(images, folder);
+        writeImages(images, sources, folder);
     // A buffer that nothing refers to has no place in the document, and no name.
     if (!options.embedBuffers && !buffer.uri.empty())
         guarded(bufferMessage,

@@ -2,6 +2,7 @@
 
 #include "i_grid_sampler.h"
 
+#include <bit>
 #include <limits>
 #include <optional>
 
@@ -146,16 +147,8 @@ base::ref<Image> packMaps(const std::array<PackedMap, 3>& redGreenBlue, u32 widt
 }
 
 base::ref<Image> makeSamplable(base::ref<Image> image) {
-    switch (image->isCompressed() ? u8(Image::IT_IMPLICIT) : image->type()) {
-    case Image::IT_UNSIGNED_BYTE:
-    case Image::IT_BYTE:
-    case Image::IT_UNSIGNED_SHORT:
-    case Image::kHalf:
-    case Image::kFloat:
+    if (GridSampler::canSample(*image))
         return image;
-    default:
-        break;
-    }
     image = image->convertFormat(Image::kRGBA);
     return image ? image->convertType(Image::IT_UNSIGNED_BYTE, 0, Image::gammaNone) : nullptr;
 }

@@ -15,8 +15,8 @@ struct PackedMap {
 };
 
 /// Occlusion, roughness and metal in the places where glTF reads them: an RGB picture of bytes,
-/// each map sampled linearly, as it repeats, at the centres of the pixels. The maps must be made
-/// of components that a `GridSampler` reads.
+/// each map sampled linearly, as it repeats, at the centres of the pixels. The maps must be such
+/// that a `GridSampler` can sample them. Null if there is not enough memory.
 base::ref<iio::Image> packMaps(const std::array<PackedMap, 3>& redGreenBlue, base::u32 width,
                                base::u32 height);
 

@@ -3,11 +3,13 @@
 #include "gltf/guarded.h"
 
 #include "b_filter.h"
+#include "b_log.h"
 #include "b_string_convert.h"
 #include "i_file.h"
 #include "stream/b_fs.h"
 
 #include <algorithm>
+#include <sys/stat.h>
 
 namespace gltf {
 
@@ -16,9 +18,6 @@ using base::u32;
 using base::u64;
 
 namespace {
-
-constexpr u32 greatestTarget = 65500; ///< a side of a JPEG
-constexpr u64 greatestPixelCount = u64(1) << 28;
 
 bool exceeds(PictureSize size, u32 greatestSide) {
     return greatestSide != 0 && std::max(size.width, size.height) > greatestSide;
@@ -38,9 +37,17 @@ base::ref<iio::Image> resized(iio::Image& image, bool hasAlpha, PictureSize size
 
 } // namespace
 
+void requireRegularFile(const string& path) {
+    struct stat status {};
+    if (::stat(base::fs::master().resolve(path).c_str(), &status) == 0 && !S_ISREG(status.st_mode))
+        throw base::exception("'" + path + "' is no regular file", "prepare_image",
+                              "gltf::requireRegularFile", __LINE__);
+}
+
 PictureHeader readPictureHeader(const string& path) {
     PictureHeader header;
     guarded("Unable to get image information!", [&] {
+        requireRegularFile(path);
         iio::ImageInfo info;
         if (iio::readImageInfo(path, info))
             header = {{info.level0.width, info.level0.height},
@@ -58,7 +65,7 @@ PictureSize limitedSize(PictureSize size, u32 greatestSide, const string& path) 
         return base::saturate<u32>(static_cast<float>(side) * scale + 0.5f);
     };
     const PictureSize target{scaled(size.width), scaled(size.height)};
-    if (std::max(target.width, target.height) <= greatestTarget &&
+    if (std::max(target.width, target.height) <= greatestImageSide &&
         u64(target.width) * target.height <= greatestPixelCount)
         return target;
     base::log().log(base::logScene, base::logWarning,
@@ -77,6 +84,7 @@ PicturePlan planPicture(const string& path, const PictureHeader& header, bool is
     plan.converts = !isPng && extension != "jpg" && extension != "jpeg";
     if (isCompressing && isPng && !header.hasAlpha)
         plan.converts = true;
+    // A picture whose shorter side has the limit's length keeps its size, but is written again.
     if (exceeds(header.size, greatestSide) &&
         (limitedSize(header.size, greatestSide, path) != header.size ||
          std::min(header.size.width, header.size.height) == greatestSide))
@@ -86,12 +94,23 @@ PicturePlan planPicture(const string& path, const PictureHeader& header, bool is
     return plan;
 }
 
-void convertPicture(const string& path, const string& target, const PicturePlan& plan,
-                    bool hasAlpha, u32 greatestSide) {
+base::ref<iio::Image> loadOpaque(const string& path, PictureSize size) {
+    base::ref<iio::Image> image;
+    if (u64(size.width) * size.height > u64(1) << 26)
+        return image;
+    guarded("Unable to load the image!", [&] { image = iio::loadImage(path); });
+    return image && !image->checkTransparency() ? image : nullptr;
+}
+
+void convertPicture(const string& path, base::ref<iio::Image> image, const string& target,
+                    const PicturePlan& plan, bool hasAlpha, u32 greatestSide) {
     base::log().log(base::logScene, base::logInformation, "Processing image {} for export!", path);
-    base::ref<iio::Image> image = iio::loadImage(path);
+    if (!image) {
+        requireRegularFile(path);
+        image = iio::loadImage(path);
+    }
     if (!image)
-        fail("There is no reader for '" + path + "', or it failed", __LINE__);
+        fail("'" + path + "' can't be read, it goes into the document as it is", __LINE__);
     if (plan.resizes)
         image = resized(*image, hasAlpha,
                         limitedSize({image->width(), image->height()}, greatestSide, path));

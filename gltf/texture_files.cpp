@@ -1,9 +1,9 @@
-#include "gltf/exporter.h"
 #include "gltf/guarded.h"
 #include "gltf/pack_maps.h"
 #include "gltf/prepare_image.h"
+#include "gltf/texture_export.h"
 
-#include "b_string_convert.h"
+#include "b_format.h"
 #include "i_file.h"
 #include "i_normal_map.h"
 #include "scene_schema.h"
@@ -25,7 +25,6 @@ using scene::ITexture;
 namespace {
 
 constexpr u32 sideWithoutSource = 1024;
-constexpr u64 greatestPixelCount = u64(1) << 28;
 constexpr std::size_t longestName = 200; ///< bytes in front of what a name ends with
 
 /// `name` as the beginning of a file name: no separators, no control characters, not too long.
@@ -43,7 +42,7 @@ string fileNameOf(string_view name) {
 }
 
 [[noreturn]] void fail(const string& text, int line) {
-    throw base::exception(text, "texture_files", "gltf::GLTFScenePlugin", line);
+    throw base::exception(text, "texture_files", "gltf::TextureExport", line);
 }
 
 void save(iio::Image& image, const string& path) {
@@ -55,12 +54,13 @@ void save(iio::Image& image, const string& path) {
 
 } // namespace
 
-ref<iio::Image> GLTFScenePlugin::loadTextureImage(const ITexture* texture) const {
+ref<iio::Image> TextureExport::loadTextureImage(const ITexture* texture) const {
     const string path = texture ? resolveTexturePath(*texture) : string();
     ref<iio::Image> image;
     if (path.empty())
         return image;
     guarded("Unable to load the image!", [&] {
+        requireRegularFile(path);
         image = iio::loadImage(path);
         if (image)
             image->setColorTransform({});
@@ -68,18 +68,19 @@ ref<iio::Image> GLTFScenePlugin::loadTextureImage(const ITexture* texture) const
     return image;
 }
 
-void GLTFScenePlugin::largestExportSize(const ITexture* texture, u32& width, u32& height) const {
+void TextureExport::largestExportSize(const ITexture* texture, u32& width, u32& height) const {
     const string path = texture ? resolveTexturePath(*texture) : string();
     if (path.empty())
         return;
-    const PictureSize size = limitedSize(readPictureHeader(path).size, exportImageMaxDim, path);
+    const PictureSize size =
+        limitedSize(readPictureHeader(path).size, settings_.exportImageMaxDim, path);
     width = std::max(width, size.width);
     height = std::max(height, size.height);
 }
 
-string GLTFScenePlugin::packOcclusionRoughnessMetal(const string& materialName,
-                                                    const ITexture* ambient, const ITexture* metal,
-                                                    const ITexture* rough) {
+string TextureExport::packOcclusionRoughnessMetal(const string& materialName,
+                                                  const ITexture* ambient, const ITexture* metal,
+                                                  const ITexture* rough) {
     string name = fileNameOf(materialName) + "_";
     std::ranges::replace(name, ' ', '_');
     name += ambient ? "Occlusion" : "";
@@ -106,8 +107,8 @@ string GLTFScenePlugin::packOcclusionRoughnessMetal(const string& materialName,
 }
 
 /// The picture of `maps` in red, green and blue. A file that is used twice is read once.
-ref<iio::Image> GLTFScenePlugin::pack(const std::array<const ITexture*, 3>& maps, u32 width,
-                                      u32 height) const {
+ref<iio::Image> TextureExport::pack(const std::array<const ITexture*, 3>& maps, u32 width,
+                                    u32 height) const {
     std::array<PackedMap, 3> packed;
     std::array<ref<iio::Image>, 3> images;
     std::array<string, 3> paths;
@@ -124,7 +125,22 @@ ref<iio::Image> GLTFScenePlugin::pack(const std::array<const ITexture*, 3>& maps
     return packMaps(packed, width, height);
 }
 
-string GLTFScenePlugin::makeNormalMapFile(const ITexture& map, const scene::IMaterial& material) {
+bool TextureExport::isHeightMap(const ITexture& map) const {
+    if (read(map, scene::bitmapTexture_schema::n_colorChannels) >= 2)
+        return true;
+    const string path = resolveTexturePath(map);
+    bool hasOneChannel = false;
+    if (!path.empty())
+        guarded("Unable to load the bump map!", [&] {
+            requireRegularFile(path);
+            iio::ImageInfo info;
+            hasOneChannel =
+                iio::readImageInfo(path, info) && iio::formatInfo(info.format).channelCount == 1;
+        });
+    return hasOneChannel;
+}
+
+string TextureExport::makeNormalMapFile(const ITexture& map, const scene::IMaterial& material) {
     const ref<iio::Image> heights = loadTextureImage(&map);
     if (!heights || !heights->isValid())
         return {};

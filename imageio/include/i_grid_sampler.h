@@ -12,8 +12,10 @@ namespace iio {
 /// where rows are asked for in order.
 class GridSampler {
 public:
-    /// For a picture that is no cube map, has pixels, and is made of 8-bit, unsigned 16-bit, half
-    /// or float components; throws `base::switch_exception` for any other.
+    /// Whether the picture has pixels, is no cube map, and is made of 8-bit, unsigned 16-bit, half
+    /// or float components.
+    static bool canSample(const Image& image);
+    /// Throws `base::switch_exception` for a picture that can't be sampled.
     GridSampler(const Image& image, u32 width, u32 height);
 
     /// Component `channel` of 0..3 (red, green, blue, alpha) along row `y` < height. Grey pictures

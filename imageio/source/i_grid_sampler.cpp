@@ -47,18 +47,11 @@ void readComponents(const u8* row, u32 step, i8 component, std::span<float> out)
     }
 }
 
-bool isInteger(const Image& image) {
-    switch (image.isCompressed() ? u8(Image::IT_IMPLICIT) : image.type()) {
-    case Image::IT_UNSIGNED_BYTE:
-    case Image::IT_BYTE:
-    case Image::IT_UNSIGNED_SHORT:
-        return true;
-    case Image::kHalf:
-    case Image::kFloat:
-        return false;
-    default:
+/// The picture, if it can be sampled.
+const Image& checked(const Image& image) {
+    if (!GridSampler::canSample(image))
         throw base::switch_exception("i_grid_sampler", "iio::GridSampler", __LINE__);
-    }
+    return image;
 }
 
 } // namespace
@@ -84,9 +77,24 @@ GridSampler::Axis::Axis(u32 gridSize, u32 pictureSize) {
     isOnPixels &= gridSize == pictureSize;
 }
 
+bool GridSampler::canSample(const Image& image) {
+    if (!image.hasPixels() || image.isCube() || image.isCompressed())
+        return false;
+    switch (image.type()) {
+    case Image::IT_UNSIGNED_BYTE:
+    case Image::IT_BYTE:
+    case Image::IT_UNSIGNED_SHORT:
+    case Image::kHalf:
+    case Image::kFloat:
+        return true;
+    default:
+        return false;
+    }
+}
+
 GridSampler::GridSampler(const Image& image, u32 width, u32 height)
-    : image_(image), columns_(width, image.width()), rows_(height, image.height()),
-      isInteger_(isInteger(image)) {
+    : image_(checked(image)), columns_(width, image.width()), rows_(height, image.height()),
+      isInteger_(image.type() != Image::kHalf && image.type() != Image::kFloat) {
     pixels_.resize(image.width());
 }
 

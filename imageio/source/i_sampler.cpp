@@ -7,7 +7,6 @@
 #include "b_exception.h"
 
 #include <algorithm>
-#include <array>
 #include <cmath>
 
 namespace iio {

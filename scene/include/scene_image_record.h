@@ -36,4 +36,15 @@ SCENE_API void setPictureSource(base::AttribMap& texture, const base::string& pa
 /// Null for a texture that shows a file as it is.
 SCENE_API const base::string* findPictureSource(const base::AttribMap& texture);
 
+/// Tells, by a transient attribute, that the alpha of the picture of `texture` does not count where
+/// it is opaque everywhere: the format of its model reads no transparency from it.
+SCENE_API void setIgnoresOpaqueAlpha(base::AttribMap& texture);
+SCENE_API bool ignoresOpaqueAlpha(const base::AttribMap& texture);
+
+/// Tells, by a transient attribute, of picture files that the scene was made of, shown by a texture
+/// or not: exporters must not write over them.
+SCENE_API void setPictureFiles(base::AttribMap& scene, const base::vector<base::string>& paths);
+/// Null if there are none.
+SCENE_API const base::vector<base::string>* findPictureFiles(const base::AttribMap& scene);
+
 } // namespace scene

@@ -18,6 +18,8 @@ struct Names {
     name_id height = base::nameServer().id("height");
     name_id byteLength = base::nameServer().id("byteLength");
     name_id pictureSource = base::nameServer().id("pictureSource");
+    name_id ignoresOpaqueAlpha = base::nameServer().id("ignoresOpaqueAlpha");
+    name_id pictureFiles = base::nameServer().id("pictureFiles");
 };
 
 const Names& names() {
@@ -59,7 +61,10 @@ base::vector<ImageRecord> findImageRecords(const AttribMap& scene) {
     base::vector<ImageRecord> records;
     const base::AttribArray* list = scene.findArray(n.list);
     for (base::u32 i = 0; list && i < list->size(); ++i) {
-        const AttribMap* item = list->item(i)->asMap();
+        const base::Attribute* entry = list->item(i);
+        const AttribMap* item = entry ? entry->asMap() : nullptr;
+        if (!item)
+            continue;
         ImageRecord& record = records.emplace_back();
         take(*item, n.name, record.name);
         if (const auto* sources = item->findVecAttribute<base::string>(n.sources))
@@ -82,6 +87,27 @@ void setPictureSource(AttribMap& texture, const base::string& path) {
 
 const base::string* findPictureSource(const AttribMap& texture) {
     return texture.findAttribute<base::string>(names().pictureSource);
+}
+
+void setIgnoresOpaqueAlpha(AttribMap& texture) {
+    const name_id name = names().ignoresOpaqueAlpha;
+    texture.attribute<bool>(name) = true;
+    makeTransient(*texture.findAttribute(name));
+}
+
+bool ignoresOpaqueAlpha(const AttribMap& texture) {
+    const bool* value = texture.findAttribute<bool>(names().ignoresOpaqueAlpha);
+    return value && *value;
+}
+
+void setPictureFiles(AttribMap& scene, const base::vector<base::string>& paths) {
+    const name_id name = names().pictureFiles;
+    scene.vecAttribute<base::string>(name) = paths;
+    makeTransient(*scene.findAttribute(name));
+}
+
+const base::vector<base::string>* findPictureFiles(const AttribMap& scene) {
+    return scene.findVecAttribute<base::string>(names().pictureFiles);
 }
 
 } // namespace scene

@@ -2,22 +2,34 @@
 
 #include "import_fixture.h"
 
+#include "i_file.h"
 #include "scene_mesh.h"
+
+#include <vector>
 
 namespace test_support {
 
 /// Imports models with materials.
 class MaterialFixture : public Import {
 protected:
-    /// Writes the beginning and the end of an opaque PNG or a JPEG, for pictures that need only
-    /// exist.
+    /// Writes a picture, for those that need only exist.
     void touch(const std::string& name) {
-        using namespace std::string_literals;
         std::filesystem::create_directories((folder_ / name).parent_path());
-        const bool isPng = std::filesystem::path(name).extension() == ".png";
-        write(name, isPng ? "\x89PNG\r\n\x1a\n" + std::string(17, '\0') + "\2" +
-                                "\0\0\0\0IEND\xAE\x42\x60\x82"s
-                          : "\xff\xd8\xff"s);
+        writePicture(name, iio::Image::kRGB, {1, 2, 3, 4, 5, 6});
+    }
+    /// Writes a picture of one row.
+    void writePicture(const std::string& name, base::u8 format,
+                      const std::vector<base::u8>& components) {
+        const base::u32 channels = iio::formatInfo(format).channelCount;
+        iio::Image image(static_cast<base::u32>(components.size()) / channels, 1, 1, 1, format,
+                         iio::Image::IT_UNSIGNED_BYTE);
+        std::copy(components.begin(), components.end(), image.data());
+        ASSERT_TRUE(iio::saveImage(image, folder_ / name));
+    }
+
+    static base::string textOf(const std::string& path) {
+        std::ifstream file(path, std::ios::binary);
+        return {std::istreambuf_iterator<char>(file), {}};
     }
 
     /// A triangle with texture coordinates and one material, "m", with these lines of MTL.

@@ -3,6 +3,7 @@
 
 #include "assimp/embedded_textures.h"
 #include "assimp/picture_folder.h"
+#include "b_base64.h"
 #include "b_exception.h"
 
 #include <assimp/texture.h>
@@ -102,8 +103,11 @@ TEST_F(Textures, EqualOnesAreOneObject) {
 TEST_F(Textures, EmbeddedOnesAreFilesAsLongAsTheScene) {
     FbxText fbx;
     fbx.addMaterial("");
-    const string jpeg = "\xff\xd8\xffrest";
-    fbx.addTexture(50, "C:\\\\art\\\\brick.bin", "DiffuseColor", "", "/9j/cmVzdA==");
+    touch("brick.jpg");
+    const string jpeg = textOf(folder_ / "brick.jpg");
+    string text(base::base64Length(jpeg.size()), '\0');
+    base::base64Encode(reinterpret_cast<const base::u8*>(jpeg.data()), jpeg.size(), text.data());
+    fbx.addTexture(50, "C:\\\\art\\\\brick.bin", "DiffuseColor", "", text);
     const string path = write("m.fbx", fbx.text());
     // As programs do it: one document for plugins and scene.
     document_ = std::make_unique<SceneFactory>();
@@ -113,13 +117,14 @@ TEST_F(Textures, EmbeddedOnesAreFilesAsLongAsTheScene) {
     ASSERT_TRUE(map);
     const std::filesystem::path file = *find(*map, fileTexture_schema::n_file);
     EXPECT_EQ(file.filename(), "brick.jpg");
-    std::ifstream stream(file, std::ios::binary);
-    EXPECT_EQ(string(std::istreambuf_iterator<char>(stream), {}), jpeg);
+    EXPECT_EQ(textOf(file), jpeg);
     document_.reset();
     EXPECT_FALSE(std::filesystem::exists(file.parent_path()));
 }
 
-TEST(EmbeddedTextures, NamesOfTheirFiles) {
+TEST_F(Textures, EmbeddedOnesGiveTheirFilesNames) {
+    touch("a.jpg");
+    const string jpeg = textOf(folder_ / "a.jpg");
     const struct {
         const char* name;
         const char* path;
@@ -139,10 +144,11 @@ TEST(EmbeddedTextures, NamesOfTheirFiles) {
         aiTexture texture;
         texture.mFilename = c.name;
         std::strcpy(texture.achFormatHint, c.hint);
-        texture.mWidth = 4;
-        texture.pcData = new aiTexel[1]{{0xff, 0xd8, 0xff, 0xe0}}; // a JPEG, whatever it is called
+        texture.mWidth = static_cast<unsigned>(jpeg.size());
+        texture.pcData = new aiTexel[jpeg.size() / sizeof(aiTexel) + 1];
+        std::memcpy(static_cast<void*>(texture.pcData), jpeg.data(), jpeg.size());
         const std::filesystem::path path = assimp::writeEmbedded(texture, c.path, *folder);
-        EXPECT_EQ(std::filesystem::file_size(path), 4u);
+        EXPECT_EQ(textOf(path), jpeg);
         EXPECT_EQ(path.filename(), c.expected);
     }
 }

@@ -11,8 +11,8 @@ namespace base::fs {
 
 TemporaryFolder::TemporaryFolder(const string& prefix) : path_(tmpPath() + prefix + "XXXXXX") {
     if (!mkdtemp(path_.data()))
-        throw api_exception("Can't make a folder in '" + tmpPath() + "'", errno, "b_fs",
-                            "base::fs::TemporaryFolder", __LINE__);
+        throw api_exception("Can't make a folder in '" + tmpPath() + "'", errno,
+                            "b_temporary_folder", "base::fs::TemporaryFolder", __LINE__);
     path_ += '/';
 }
 
