@@ -1,8 +1,8 @@
 #include "document_support.h"
+#include "temp_folder.h"
 
 #include "stream/b_fs.h"
 
-#include <filesystem>
 #include <fstream>
 #include <sys/stat.h>
 
@@ -21,24 +21,17 @@ ref<Image> imageOf(string_view bytes, const string& extension) {
 
 class ImageFiles : public testing::Test {
 protected:
-    ImageFiles() {
-        string pattern = testing::TempDir() + "imagesXXXXXX";
-        folder_ = string(::mkdtemp(pattern.data())) + "/";
-        put("a.png", pngHead);
-    }
-    ~ImageFiles() override {
-        Image::clearCache();
-        std::filesystem::remove_all(folder_);
-    }
+    ImageFiles() { put("a.png", pngHead); }
+    ~ImageFiles() override { Image::clearCache(); }
     string put(const string& name, const string& bytes) {
-        std::ofstream(folder_ + name, std::ios::binary) << bytes;
-        return folder_ + name;
+        std::ofstream(folder_ / name, std::ios::binary) << bytes;
+        return folder_ / name;
     }
-    string folder_;
+    test_support::TempFolder folder_;
 };
 
 TEST_F(ImageFiles, AreReadOnce) {
-    const string path = folder_ + "a.png";
+    const string path = folder_ / "a.png";
     const ref<Image> image = Image::load(path);
     EXPECT_EQ(image->uri, "a.png");
     EXPECT_EQ(image->cacheKey, path);
@@ -56,14 +49,14 @@ TEST_F(ImageFiles, AreReadOnce) {
 }
 
 TEST_F(ImageFiles, ThatAreNoFilesHaveNoData) {
-    ASSERT_EQ(::mkfifo((folder_ + "pipe.png").c_str(), 0600), 0);
+    ASSERT_EQ(::mkfifo((folder_ / "pipe.png").c_str(), 0600), 0);
     const struct {
         string path, uri;
-    } rows[] = {{folder_ + "missing.png", "missing.png"},
-                {folder_ + "pipe.png", "pipe.png"},
-                {folder_, ""},
+    } rows[] = {{folder_ / "missing.png", "missing.png"},
+                {folder_ / "pipe.png", "pipe.png"},
+                {folder_ / "", ""},
                 {put("empty.png", ""), "empty.png"},
-                {folder_ + "a.png" + string("\0x", 2), "a.png" + string("\0x", 2)}};
+                {folder_ / "a.png" + string("\0x", 2), "a.png" + string("\0x", 2)}};
     for (const auto& row : rows) {
         const ref<Image> image = Image::load(row.path);
         EXPECT_EQ(image->data, nullptr) << row.path;
@@ -73,8 +66,8 @@ TEST_F(ImageFiles, ThatAreNoFilesHaveNoData) {
 }
 
 TEST_F(ImageFiles, AreFoundUnderThePathsOfTheFileSystems) {
-    EXPECT_NE(Image::load("file://" + folder_ + "a.png")->data, nullptr);
-    base::fs::aliases().set("pictures", folder_);
+    EXPECT_NE(Image::load("file://" + folder_ / "a.png")->data, nullptr);
+    base::fs::aliases().set("pictures", folder_ / "");
     EXPECT_NE(Image::load("pictures:/a.png")->data, nullptr);
     base::fs::aliases().remove("pictures");
 }

@@ -80,17 +80,6 @@ TEST(Materials, WriteTheirMembersByTheirRules) {
     }
 }
 
-TEST(Textures, WriteAllTheirMembers) {
-    Texture texture;
-    texture.sampler = makeRef<Sampler>(9729, 0, 33071, 10497);
-    texture.source = makeRef<Image>("a.png", "");
-    texture.sampler->id = 3;
-    texture.source->id = 0;
-    EXPECT_EQ(written(texture), R"({"sampler":3,"source":0})");
-    EXPECT_EQ(written(*texture.sampler),
-              R"({"magFilter":9729,"minFilter":0,"wrapS":33071,"wrapT":10497})");
-}
-
 TEST(Lights, WriteAnObjectUnderTheirOwnWord) {
     using Type = MaterialCommon::Light::Type;
     const struct {

@@ -4,31 +4,17 @@
 #include "support/gltf_reader.h"
 #include "support/log_capture.h"
 #include "support/scene_builder.h"
+#include "support/temp_folder.h"
 
 #include "b_exception.h"
 #include "gltf/plugin_desc.h"
 
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <functional>
 #include <gtest/gtest.h>
 
 namespace test_support {
-
-/// A folder that is removed at the end.
-class TempFolder {
-public:
-    TempFolder() {
-        if (!::mkdtemp(path_.data()))
-            throw std::runtime_error("no temporary folder");
-    }
-    ~TempFolder() { std::filesystem::remove_all(path_); }
-    std::string operator/(const std::string& name) const { return path_ + "/" + name; }
-
-private:
-    std::string path_ = (std::filesystem::temp_directory_path() / "gltf_test_XXXXXX").string();
-};
 
 inline std::string readText(const std::string& path) {
     const Bytes bytes = readBytes(path);

@@ -131,17 +131,19 @@ struct ImageDocument {
         material->normalTexture = slot;
         mesh->primitives.push_back(base::makeRef<GLTF::Primitive>());
         mesh->primitives.back()->material = material;
+        sources.add(source);
         return *slot->texture->source;
     }
     void writeTo(const std::string& path) {
         auto node = base::makeRef<GLTF::Node>();
         node->mesh = mesh;
         asset->getDefaultScene().nodes.push_back(node);
-        gltf::writeOutputFiles(*asset, options, *asset->packAccessors(), {}, path);
+        gltf::writeOutputFiles(*asset, options, *asset->packAccessors(), sources, path);
     }
 
     base::ref<GLTF::Asset> asset = base::makeRef<GLTF::Asset>();
     base::ref<GLTF::Mesh> mesh = base::makeRef<GLTF::Mesh>();
+    gltf::SourceFiles sources;
     GLTF::Options options;
 };
 
@@ -168,11 +170,14 @@ TEST(Images, OfEqualNamesGetFilesOfTheirOwn) {
     const TempFolder folder;
     std::filesystem::create_directory(folder / "dir.png");
     std::ofstream(folder / "wood.png") << "source"; // which the brick was read from
+    std::filesystem::create_symlink("wood.png", folder / "link.png");
     struct {
         const char *uri, *bytes;
         std::string source, newUri;
     } const rows[] = {{"wood.png", "converted", folder / "x/../wood.jpg", "wood_2.png"},
-                      {"Wood.png", "another", "/elsewhere/wood.png", "Wood_3.png"},
+                      {"Wood_2.png", "another", "/elsewhere/wood.png", "Wood_2_2.png"},
+                      {"link.png", "linked", "", "link_2.png"},
+                      {"A.gltf", "main", "", "A_2.gltf"},
                       {"wood.png", "converted", "", "wood_2.png"},
                       {"brick.png", "read", folder / "wood.png", "brick.png"},
                       {"gone.png", "", "", "gone.png"},

@@ -77,11 +77,9 @@ struct MaterialExport : Exporting {
         write(mesh, scene::mesh_schema::n_indices) = {0, 1, 2};
         set(Settings::n_exportEmbedded, false);
         std::filesystem::create_directory(folder / "out");
-        setenv("TMPDIR", (temporary_ / "").c_str(), 1);
     }
     ~MaterialExport() {
-        setenv("TMPDIR", tmpdirBefore_.c_str(), 1);
-        EXPECT_TRUE(std::filesystem::is_empty(temporary_ / ""));
+        EXPECT_TRUE(std::filesystem::is_empty(temporary_.path()));
         for (const auto& [path, bytes] : sources_) {
             EXPECT_EQ(readBytes(path), bytes) << path;
             EXPECT_EQ(std::filesystem::last_write_time(path), longAgo_) << path;
@@ -142,7 +140,7 @@ struct MaterialExport : Exporting {
 
 private:
     TempFolder temporary_;
-    std::string tmpdirBefore_ = std::filesystem::temp_directory_path().string();
+    TmpDirGuard tmpdir_{temporary_.path()};
     std::filesystem::file_time_type longAgo_{};
     std::map<std::string, Bytes> sources_;
 };

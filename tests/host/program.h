@@ -1,5 +1,7 @@
 #pragma once
 
+#include "support/temp_folder.h"
+
 #include <filesystem>
 #include <gtest/gtest.h>
 #include <rapidjson/document.h>
@@ -26,9 +28,6 @@ void expectJson(const rapidjson::Value& value, const char* expected);
 /// that folder.
 class ProgramTest : public testing::Test {
 protected:
-    ProgramTest();
-    ~ProgramTest() override;
-
     /// Runs scene_export with the scripted plugins.
     Outcome run(std::vector<std::string> arguments);
     /// Runs it with the plugins beside it.
@@ -42,7 +41,8 @@ protected:
     rapidjson::Document report() const;
     bool exists(const std::string& name) const { return std::filesystem::exists(path(name)); }
 
-    std::filesystem::path folder_;
+private:
+    test_support::TempFolder folder_;
 };
 
 } // namespace host_test

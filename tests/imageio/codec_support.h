@@ -4,12 +4,12 @@
 #include "i_plugin.h"
 #include "log_capture.h"
 #include "picture_builder.h"
+#include "temp_folder.h"
 
 #include "stream/b_stream_workers.h"
 
 #include <cstdio>
 #include <filesystem>
-#include <unistd.h>
 
 /// What the tests of the formats share.
 namespace iio {
@@ -61,22 +61,5 @@ T valueOf(const base::AttribMap& attributes, base::name_id name) {
     const T* value = attributes.findAttribute<T>(name);
     return value ? *value : T();
 }
-
-/// A folder of its own, gone with the object.
-class TempFolder {
-public:
-    TempFolder() {
-        string pattern = testing::TempDir() + "imageioXXXXXX";
-        path_ = string(::mkdtemp(pattern.data())) + "/";
-    }
-    ~TempFolder() { std::filesystem::remove_all(path_.c_str()); }
-    TempFolder(const TempFolder&) = delete;
-    TempFolder& operator=(const TempFolder&) = delete;
-
-    string file(const char* name) const { return path_ + name; }
-
-private:
-    string path_;
-};
 
 } // namespace iio

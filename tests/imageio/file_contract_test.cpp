@@ -8,6 +8,7 @@ namespace {
 
 using test_support::linesOf;
 using test_support::LogCapture;
+using test_support::TempFolder;
 
 struct Seed {
     string name; ///< of its format, "/", and the file's
@@ -146,7 +147,7 @@ TEST(FileContract, SavingSaysWhatItLacks) {
             EXPECT_EQ(log.entries()[0].level, base::logError);
             EXPECT_NE(log.entries()[0].text.find(name), string::npos) << linesOf(log);
         }
-        const string path = folder.file(name);
+        const string path = folder / name;
         std::filesystem::create_symlink("/dev/full", path.c_str());
         LogCapture log;
         EXPECT_FALSE(saveImage(*makeCounting(300, 300, Image::kRGB), path));

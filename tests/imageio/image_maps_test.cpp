@@ -3,6 +3,7 @@
 #include "i_normal_map.h"
 #include "log_capture.h"
 #include "picture_builder.h"
+#include "temp_folder.h"
 
 #include "stream/b_fs.h"
 
@@ -129,7 +130,8 @@ TEST(Cubemap, RefusesWhatDoesNotFit) {
 }
 
 TEST(Cubemap, FindsTheFilesOfTheFaces) {
-    const string folder = testing::TempDir() + "cubemap faces/";
+    const test_support::TempFolder home;
+    const string folder = home / "cubemap faces/";
     base::fs::master().mkdir(folder);
     struct Row {
         const char* names[6];

@@ -7,6 +7,7 @@ namespace {
 
 using test_support::linesOf;
 using test_support::LogCapture;
+using test_support::TempFolder;
 
 const ImageAttributes& names = imageAttributes();
 
@@ -31,58 +32,58 @@ TEST(ImageRegistry, ExtensionsChooseTheFormat) {
     const TempFolder folder;
     const ref<Image> image = makeCounting(8, 8, Image::kRGB);
     for (const char* name : {"a.png", "b.PNG", "c.x.jpe"}) {
-        EXPECT_TRUE(saveImage(*image, folder.file(name)));
-        EXPECT_TRUE(loadImage(folder.file(name))) << name;
+        EXPECT_TRUE(saveImage(*image, folder / name));
+        EXPECT_TRUE(loadImage(folder / name)) << name;
     }
     for (const char* name : {"d", "png", "e.bmp", "f.png.gz", "nowhere/g.png"}) {
         LogCapture log;
-        EXPECT_FALSE(saveImage(*image, folder.file(name))) << name;
+        EXPECT_FALSE(saveImage(*image, folder / name)) << name;
         EXPECT_EQ(log.has(base::logError, "Unable to open the image file for writing!"),
                   string_view(name).find(".png") != string_view::npos);
-        EXPECT_FALSE(std::filesystem::exists(folder.file(name).c_str()));
+        EXPECT_FALSE(std::filesystem::exists(folder / name));
     }
 
-    std::filesystem::copy(folder.file("a.png").c_str(), folder.file("a.jpg").c_str());
-    std::filesystem::copy(folder.file("a.png").c_str(), folder.file("a").c_str());
+    std::filesystem::copy(folder / "a.png", folder / "a.jpg");
+    std::filesystem::copy(folder / "a.png", folder / "a");
     for (const char* name : {"a.jpg", "a"}) {
         LogCapture log;
         ImageInfo info;
-        EXPECT_FALSE(readImageInfo(folder.file(name), info));
+        EXPECT_FALSE(readImageInfo(folder / name, info));
         EXPECT_EQ(linesOf(log), "");
-        EXPECT_FALSE(loadImage(folder.file(name)));
-        EXPECT_EQ(linesOf(log), base::format("2 Unable to load {}\n", folder.file(name)));
+        EXPECT_FALSE(loadImage(folder / name));
+        EXPECT_EQ(linesOf(log), base::format("2 Unable to load {}\n", folder / name));
     }
 }
 
 TEST(ImageRegistry, LoadedPicturesKnowTheirFile) {
     const TempFolder folder;
-    ASSERT_TRUE(saveImage(*makeCounting(3, 2, Image::kRGB), folder.file("a.png")));
-    const ref<Image> image = loadImage(folder.file("b/../a.png"));
+    ASSERT_TRUE(saveImage(*makeCounting(3, 2, Image::kRGB), folder / "a.png"));
+    const ref<Image> image = loadImage(folder / "b/../a.png");
     ASSERT_TRUE(image);
-    EXPECT_EQ(image->path(), folder.file("a.png"));
+    EXPECT_EQ(image->path(), folder / "a.png");
     EXPECT_TRUE(image->isFromFile());
     EXPECT_EQ(bytesOf(*image), bytesOf(*makeCounting(3, 2, Image::kRGB)));
-    EXPECT_TRUE(loadImage(folder.file("a.png"), nullptr, 0, 0));
-    EXPECT_FALSE(loadImage(folder.file("a.png"), nullptr, 0, 1));
+    EXPECT_TRUE(loadImage(folder / "a.png", nullptr, 0, 0));
+    EXPECT_FALSE(loadImage(folder / "a.png", nullptr, 0, 1));
 
     ImageInfo info;
     info.levels.resize(3);
     info.attributes.attribute<string>(names.n_Comment) = "old";
-    ASSERT_TRUE(readImageInfo(folder.file("a.png"), info));
+    ASSERT_TRUE(readImageInfo(folder / "a.png", info));
     EXPECT_TRUE(info.levels.empty());
     EXPECT_EQ(info.attributes.size(), 0u);
 }
 
 TEST(ImageRegistry, FilesThatCannotBeOpened) {
     const TempFolder folder;
-    std::filesystem::create_directory(folder.file("folder.png").c_str());
+    std::filesystem::create_directory(folder / "folder.png");
     for (const char* name : {"missing.png", "folder.png"}) {
         ImageInfo info;
         LogCapture log;
-        EXPECT_FALSE(readImageInfo(folder.file(name), info));
+        EXPECT_FALSE(readImageInfo(folder / name, info));
         const auto reported = log.take();
         ASSERT_EQ(reported.size(), 1u) << name;
-        EXPECT_FALSE(loadImage(folder.file(name)));
+        EXPECT_FALSE(loadImage(folder / name));
         ASSERT_EQ(log.entries().size(), 2u) << name;
         EXPECT_EQ(log.entries()[0].text, "Unable to open the image file for reading!");
         EXPECT_EQ(log.entries()[0].channel, base::logIO);

@@ -2,6 +2,7 @@
 
 #include "log_capture.h"
 #include "scene.h"
+#include "temp_folder.h"
 
 #include "b_exception.h"
 #include "b_format.h"
@@ -17,22 +18,14 @@ using base::string;
 using namespace test_support;
 namespace files = std::filesystem;
 
-/// A folder with the plugins of the test, gone at the end.
-class PluginFolder {
-public:
+/// A folder with the plugins of the test.
+struct PluginFolder : TempFolder {
     PluginFolder(std::initializer_list<const char*> plugins, const char* order = nullptr) {
-        string pattern = (files::temp_directory_path() / "sceneXXXXXX").string();
-        path_ = mkdtemp(pattern.data());
         for (const char* plugin : plugins)
-            files::create_symlink(files::path(TEST_PLUGINS) / plugin, path_ / plugin);
+            files::create_symlink(files::path(TEST_PLUGINS) / plugin, *this / plugin);
         if (order)
-            std::ofstream(path_ / "importers.txt") << order;
+            std::ofstream(*this / "importers.txt") << order;
     }
-    ~PluginFolder() { files::remove_all(path_); }
-    string path() const { return path_.string(); }
-
-private:
-    files::path path_;
 };
 
 /// A factory with the plugins of a folder of its own.

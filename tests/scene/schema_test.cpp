@@ -2,7 +2,6 @@
 
 #include "log_capture.h"
 #include "scene.h"
-#include "scene_image_record.h"
 #include "scene_options.h"
 
 #include "b_exception.h"
@@ -104,31 +103,6 @@ TEST_F(Schema, ObjectsAnswerForTheirInterfaces) {
     EXPECT_EQ(mesh->queryInterface(hierarchical), nullptr);
     EXPECT_EQ(light->queryInterface(bounded), nullptr);
     EXPECT_EQ(node->queryInterface(base::nameServer().id("INothing")), nullptr);
-}
-
-TEST_F(Schema, ScenesKeepTheRecordsOfTheirPictures) {
-    register_scene_schema(factory_);
-    const auto object = factory_.create(scene_schema::n_kind);
-    EXPECT_TRUE(findImageRecords(*object).empty());
-    const base::vector<ImageRecord> many{
-        {"a.jpg", {"/x/a.png", "b.tga"}, ImageRecord::Work::packed, 3, 65500, 0xffffffff},
-        {"gone.png", {}, ImageRecord::Work::kept, -1, -1, 0}};
-    storeImageRecords(*object, many);
-    base::vector<ImageRecord> found = findImageRecords(*object);
-    ASSERT_EQ(found.size(), 2u);
-    for (base::u32 i = 0; i < 2; ++i) {
-        EXPECT_EQ(found[i].name, many[i].name);
-        EXPECT_EQ(found[i].sources, many[i].sources);
-        EXPECT_EQ(found[i].work, many[i].work);
-        EXPECT_EQ(found[i].width, many[i].width);
-        EXPECT_EQ(found[i].height, many[i].height);
-        EXPECT_EQ(found[i].byteLength, many[i].byteLength);
-    }
-    // Those of the next export replace them.
-    storeImageRecords(*object, {many[1]});
-    found = findImageRecords(*object);
-    ASSERT_EQ(found.size(), 1u);
-    EXPECT_EQ(found[0].name, "gone.png");
 }
 
 TEST_F(Schema, ProgramsMayReplaceAClass) {

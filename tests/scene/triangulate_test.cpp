@@ -3,16 +3,15 @@
 #include "mesh_builder.h"
 
 #include "log_capture.h"
+#include "temp_folder.h"
 
 #include <cmath>
 #include <cstdlib>
-#include <filesystem>
 #include <fstream>
 #include <functional>
 #include <limits>
 #include <numbers>
 #include <random>
-#include <unistd.h>
 
 namespace {
 
@@ -359,20 +358,18 @@ void cutWithBrokenLibrary() {
     const bool good = triangles.size() == 9 && log.entries().size() == 1 &&
                       log.entries()[0].level == 3 && log.entries()[0].text.starts_with(start) &&
                       log.entries()[0].text.ends_with(end);
-    _exit(good ? 0 : 1);
+    std::exit(good ? 0 : 1);
 }
 
 TEST(PolygonTriangulationDeathTest, WorksWithoutTheLibrary) {
     GTEST_FLAG_SET(death_test_style, "threadsafe"); // in a process that starts anew
-    string folder = (std::filesystem::temp_directory_path() / "geosXXXXXX").string();
-    ASSERT_NE(mkdtemp(folder.data()), nullptr);
-    std::ofstream(folder + "/libgeos_c.so.1");
+    static const TempFolder folder;                 // that of the new process goes with it
+    std::ofstream(folder / "libgeos_c.so.1");
     const char* before = getenv("LD_LIBRARY_PATH");
     const string path = before ? before : "";
-    setenv("LD_LIBRARY_PATH", (folder + ":" + path).c_str(), 1);
+    setenv("LD_LIBRARY_PATH", (folder.path() + ":" + path).c_str(), 1);
     EXPECT_EXIT(cutWithBrokenLibrary(), testing::ExitedWithCode(0), "");
     setenv("LD_LIBRARY_PATH", path.c_str(), 1);
-    std::filesystem::remove_all(folder);
 }
 
 class Triangulation : public MeshTest {
