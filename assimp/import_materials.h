@@ -1,38 +1,9 @@
 #pragma once
 
 #include "assimp/import_geometry.h"
-#include "assimp/import_textures.h"
-
-struct aiMaterial;
+#include "assimp/material_maker.h"
 
 namespace assimp {
-
-/// What is known of materials by the format of their file, beyond what the library tells of them.
-struct MaterialFormat {
-    /// `extension` is that of the file, in lower case.
-    explicit MaterialFormat(base::string_view extension);
-
-    /// A map stands in the place of the color or number that it is a map of; else they multiply.
-    bool mapsReplace;
-    /// Opacity 0 is written for opaque materials.
-    bool zeroIsOpaque;
-    /// The diffuse color has an alpha that counts.
-    bool diffuseHasAlpha;
-    /// The simplest shading model stands for materials without a highlight.
-    bool gouraudIsMatte;
-};
-
-/// What of the materials of a file is left out or put right, counted for one report.
-struct MaterialFaults {
-    base::u64 nonFiniteValues = 0;
-    base::u64 opacityMaps = 0;
-    base::u64 glossMaps = 0;
-    base::u64 metalWithoutMap = 0;
-    base::u64 transformedTextures = 0;
-
-    /// Logs one line for each kind that occurred.
-    void report(const base::string& path) const;
-};
 
 /// Makes the materials of a file, each when a mesh first asks for it.
 class MaterialImport {
