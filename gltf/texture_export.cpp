@@ -212,7 +212,11 @@ void TextureExport::describeImage(const GLTF::Image& image, base::vector<string>
 SourceFiles TextureExport::findPictureFiles(const base::PluginFactory& sceneObjects,
                                             const base::IPlugin& sceneObject) const {
     SourceFiles files;
+    if (settings_.exportEmbedded)
+        return files;
     for (const ref<base::IPlugin>& object : sceneObjects.plugins()) {
+        if (!object || object->typeName() != fileTexture_schema::n_kind)
+            continue;
         const auto* texture = dynamic_cast<const scene::IFileTexture*>(object.get());
         if (!texture)
             continue;

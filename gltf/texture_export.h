@@ -59,7 +59,8 @@ public:
                        scene::ImageRecord::Work work);
     /// The file that the texture's picture comes from; empty without one.
     base::string sourceOf(const scene::ITexture& texture) const;
-    /// All picture files that the objects name, shown or not.
+    /// All picture files that the objects name, shown or not; none if no image will be written
+    /// beside the document.
     SourceFiles findPictureFiles(const base::PluginFactory& sceneObjects,
                                  const base::IPlugin& sceneObject) const;
     /// What became of the pictures of the document.
