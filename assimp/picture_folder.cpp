@@ -24,12 +24,7 @@ string fileNamePart(string_view text, std::size_t longest, string_view otherwise
     std::erase_if(part, [](char c) {
         return static_cast<unsigned char>(c) < 0x20 || c == 0x7f || c == '/' || c == '\\';
     });
-    if (part.size() > longest) {
-        const auto isContinuation = [](char c) { return (c & 0xc0) == 0x80; };
-        while (longest > 0 && isContinuation(part[longest]))
-            --longest;
-        part.resize(longest);
-    }
+    part.resize(base::cutUtf8(part, longest).size());
     return part.empty() ? string(otherwise) : part;
 }
 

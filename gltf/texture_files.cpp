@@ -4,6 +4,7 @@
 #include "gltf/texture_export.h"
 
 #include "b_format.h"
+#include "b_string_convert.h"
 #include "i_file.h"
 #include "i_normal_map.h"
 #include "scene_schema.h"
@@ -29,11 +30,7 @@ constexpr std::size_t longestName = 200; ///< bytes in front of what a name ends
 
 /// `name` as the beginning of a file name: no separators, no control characters, not too long.
 string fileNameOf(string_view name) {
-    std::size_t end = std::min(name.size(), longestName);
-    // Not through the middle of a character of UTF-8.
-    while (end < name.size() && end > 0 && (static_cast<u8>(name[end]) & 0xC0) == 0x80)
-        --end;
-    string result(name.substr(0, end));
+    string result(base::cutUtf8(name, longestName));
     for (char& c : result) {
         if (c == '/' || c == '\\' || static_cast<u8>(c) < 0x20 || c == 0x7F)
             c = '_';

@@ -43,5 +43,7 @@ BASE1_API vector<string_view> split(string_view text, char separator);
 /// The text with U+FFFD in the place of each broken UTF-8 sequence; valid text is returned
 /// unchanged.
 BASE1_API string toValidUtf8(string_view text);
+/// The beginning of UTF-8 text, at most `longest` bytes, that ends with a whole character.
+BASE1_API string_view cutUtf8(string_view text, std::size_t longest);
 
 } // namespace base

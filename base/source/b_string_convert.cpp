@@ -161,6 +161,15 @@ vector<string_view> split(string_view text, char separator) {
     }
 }
 
+string_view cutUtf8(string_view text, std::size_t longest) {
+    if (text.size() <= longest)
+        return text;
+    const auto isContinuation = [](char c) { return (c & 0xC0) == 0x80; };
+    while (longest > 0 && isContinuation(text[longest]))
+        --longest;
+    return text.substr(0, longest);
+}
+
 string toValidUtf8(string_view text) {
     string out;
     out.reserve(text.size());
