@@ -99,33 +99,27 @@ const PictureFile& TextureImport::findFile(const string& path, string_view mater
 }
 
 PictureFile TextureImport::searchFile(const string& path, string_view material) {
-    const auto make = [&](string& made, const auto& makeFile) {
-        try {
-            made = makeFile();
-        } catch (const std::exception& e) {
-            base::log().log(base::logScene, base::logWarning,
-                            "assimp |{}| The texture '{}' is left out! {}", material, path,
-                            e.what());
-        }
-        return made;
-    };
-    if (const aiTexture* embedded = findEmbedded(source_, path)) {
-        const auto [at, isNew] = embeddedFiles_.try_emplace(embedded);
-        if (isNew)
-            make(at->second, [&] { return writeEmbedded(*embedded, path, *pictures_); });
-        return {at->second, modelPath_};
-    }
     vector<string> tried;
-    const string file = findPicture(path, tried);
-    if (!file.empty()) {
-        const auto [at, isNew] = readableFiles_.try_emplace(file);
-        if (isNew)
-            make(at->second, [&] { return readableFile(file); });
-        return {at->second, file};
+    try {
+        if (const aiTexture* embedded = findEmbedded(source_, path)) {
+            const auto [at, isNew] = embeddedFiles_.try_emplace(embedded);
+            if (isNew)
+                at->second = writeEmbedded(*embedded, path, *pictures_);
+            return {at->second, modelPath_};
+        }
+        if (const string file = findPicture(path, tried); !file.empty()) {
+            const auto [at, isNew] = readableFiles_.try_emplace(file);
+            if (isNew)
+                at->second = readableFile(file);
+            return {at->second, file};
+        }
+        base::log().log(base::logScene, base::logWarning,
+                        "assimp |{}| Unable to find the texture '{}', it is left out! Tried: {}",
+                        material, path, joinedList(tried));
+    } catch (const std::exception& e) {
+        base::log().log(base::logScene, base::logWarning,
+                        "assimp |{}| The texture '{}' is left out! {}", material, path, e.what());
     }
-    base::log().log(base::logScene, base::logWarning,
-                    "assimp |{}| Unable to find the texture '{}', it is left out! Tried: {}",
-                    material, path, joinedList(tried));
     return {};
 }
 

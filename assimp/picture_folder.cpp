@@ -28,13 +28,6 @@ string fileNamePart(string_view text, std::size_t longest, string_view otherwise
     return part.empty() ? string(otherwise) : part;
 }
 
-void writeFile(const string& path, std::span<const base::u8> bytes) {
-    base::Stream stream;
-    base::fs::master().open(stream, path, base::fs::openReplace);
-    stream.setFlags(stream.flags() | base::streamThrowOnShortWrite);
-    stream.write(bytes.data(), bytes.size());
-}
-
 [[noreturn]] void fail(const char* reason, int line) {
     throw base::exception(reason, "picture_folder", "assimp::PictureFolder", line);
 }
@@ -55,7 +48,7 @@ string PictureFolder::newPath(string_view name, string_view extension) {
 string PictureFolder::add(string_view name, string_view extension,
                           std::span<const base::u8> bytes) {
     string path = newPath(name, extension);
-    writeFile(path, bytes);
+    base::fs::writeFile(path, bytes.data(), bytes.size());
     return path;
 }
 

@@ -26,20 +26,6 @@ constexpr const char* mainFileMessage = "Unable to write the GLTF file!";
 constexpr const char* imageMessage = "Couldn't write the image to external file!";
 constexpr const char* bufferMessage = "Couldn't write the binary buffer to external file!";
 
-/// A new file, in the place of what is at `path`; short writes throw.
-base::Stream openFile(const string& path) {
-    base::Stream stream;
-    base::fs::master().open(stream, path, base::fs::openReplace);
-    stream.setFlags(stream.flags() | base::streamThrowOnShortWrite);
-    return stream;
-}
-
-void writeFile(const string& path, const u8* data, base::i32 byteLength) {
-    base::Stream stream = openFile(path);
-    stream.write(data, static_cast<u64>(byteLength));
-    stream.close();
-}
-
 // Text form
 
 /// Passes the pieces of a text on to a stream as if they were written at once: when one comes out
@@ -69,7 +55,7 @@ private:
 };
 
 void writeText(const string& path, string_view json) {
-    base::Stream stream = openFile(path);
+    base::Stream stream = base::fs::createFile(path);
     stream.setFlags(stream.flags() & ~u32(base::streamThrowOnShortWrite));
     StreamSink sink(stream);
     GLTF::writePretty(json, sink);
@@ -118,7 +104,7 @@ void writeContainer(const string& path, string_view json, const Buffer& buffer, 
                          total),
             "output_files", "gltf::writeContainer", __LINE__);
 
-    base::Stream stream = openFile(path);
+    base::Stream stream = base::fs::createFile(path);
     ContainerWriter out(stream);
     out.bytes("glTF", 4);
     out.number(isVersion1 ? 1 : 2);
@@ -189,7 +175,7 @@ void writeImages(const base::vector<Image*>& images, const SourceFiles& sources,
         if (image->data && image->byteLength > 0)
             guarded(imageMessage, [&] {
                 if (!sources.contains(path))
-                    writeFile(path, image->data, image->byteLength);
+                    base::fs::writeFile(path, image->data, static_cast<u64>(image->byteLength));
             });
         else
             base::log().log(base::logScene, base::logWarning,
@@ -216,8 +202,10 @@ void writeOutputFiles(Asset& asset, const GLTF::Options& options, Buffer& buffer
         writeImages(images, sources, folder);
     // A buffer that nothing refers to has no place in the document, and no name.
     if (!options.embedBuffers && !buffer.uri.empty())
-        guarded(bufferMessage,
-                [&] { writeFile(folder + buffer.uri, buffer.data, buffer.byteLength); });
+        guarded(bufferMessage, [&] {
+            base::fs::writeFile(folder + buffer.uri, buffer.data,
+                                static_cast<u64>(buffer.byteLength));
+        });
 }
 
 } // namespace gltf

@@ -11,11 +11,17 @@ using base::vec2f;
 using scene::mesh_schema;
 using scene::meshUVSet_schema;
 
+namespace {
+
+/// True if the set becomes texture coordinates of the document: it has one pair of numbers for each
+/// vertex.
 bool isExportedUVSet(const AttribMap& set, std::size_t vertexCount) {
     const base::Attribute* uv = set.findAttribute(meshUVSet_schema::n_UV);
     return uv && uv->type() == base::TypeTraits<vec2f>::n_array_name && vertexCount != 0 &&
            static_cast<const base::vector<vec2f>*>(uv->data())->size() == vertexCount;
 }
+
+} // namespace
 
 base::i32 findTexCoord(const scene::IMesh& mesh, base::string_view name) {
     const auto* positions = find(mesh, mesh_schema::n_positions);

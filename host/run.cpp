@@ -56,15 +56,6 @@ void tellProgress(base::u32 percent, const char* what, const string& path) {
     base::log().progress(percent, base::format("{} {}", what, base::fs::fileName(path)));
 }
 
-/// Replaces the content of the file.
-void writeFile(const string& path, const string& text) {
-    base::Stream stream;
-    base::fs::master().open(stream, path, base::fs::openReplace);
-    stream.setFlags(stream.flags() | base::streamThrowOnShortWrite);
-    stream.write(text.data(), text.size());
-    stream.close();
-}
-
 } // namespace
 
 Run::Run(scene::SceneFactory& factory, const CommandLine& line,
@@ -199,7 +190,8 @@ ExitCode Run::judged(ExitCode failure) const {
 void Run::writeReport() {
     record_.clock.end();
     const std::size_t failedBefore = messages_.countFailedFiles();
-    writeFile(options_.reportFile, reportText(record_, messages_.all(), registered_));
+    const string text = reportText(record_, messages_.all(), registered_);
+    base::fs::writeFile(options_.reportFile, text.data(), text.size());
     if (messages_.countFailedFiles() != failedBefore)
         throw base::exception("could not be closed");
 }

@@ -119,6 +119,13 @@ private:
 BASE1_API MasterFS& master();
 BASE1_API Aliases& aliases();
 
+/// A stream on a new file in the place of what is at `path`; short writes throw. Throws as
+/// `MasterFS::open`.
+BASE1_API Stream createFile(const string& path);
+/// Makes `byteCount` bytes the whole content of the file at `path`. Throws as `createFile`, and for
+/// a short write.
+BASE1_API void writeFile(const string& path, const void* data, u64 byteCount);
+
 /// The system's temporary folder, with a separator at its end. Throws `api_exception` if there
 /// is none.
 BASE1_API string tmpPath();

@@ -181,4 +181,17 @@ MasterFS& master() {
     return instance;
 }
 
+Stream createFile(const string& path) {
+    Stream stream;
+    master().open(stream, path, openReplace);
+    stream.setFlags(stream.flags() | streamThrowOnShortWrite);
+    return stream;
+}
+
+void writeFile(const string& path, const void* data, u64 byteCount) {
+    Stream stream = createFile(path);
+    stream.write(data, byteCount);
+    stream.close();
+}
+
 } // namespace base::fs
