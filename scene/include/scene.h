@@ -53,6 +53,8 @@ public:
     virtual void setTransform(const base::mat43& transform) = 0;
     /// True if translation, scale or rotation is linked to an animation layer.
     virtual bool hasTransformChannels() const = 0;
+    /// The times, on the scene's timeline, of the keys of these links; sorted, each once.
+    virtual void getTransformKeyTimes(base::vector<base::TimeCode>& times) const = 0;
 };
 
 /// Declares a class of objects with nothing but a schema.
@@ -91,6 +93,7 @@ public:
     void getWorldTransform(base::mat43& transform) const override;
     void setTransform(const base::mat43& transform) override;
     bool hasTransformChannels() const override;
+    void getTransformKeyTimes(base::vector<base::TimeCode>& times) const override;
 
     /// What a transform does without.
     enum TransformFault : base::u8 {
@@ -153,7 +156,6 @@ SCENE_CLASS(IRenderOutput, base::IPlugin, renderOutput)
 SCENE_CLASS(IBuffer, base::IPlugin, buffer)
 SCENE_CLASS(IKeyframeChannel, base::IPlugin, keyframeChannel)
 SCENE_CLASS(IAnimClip, base::IPlugin, animClip)
-SCENE_CLASS(IAnimLayer, base::IPlugin, animLayer)
 SCENE_CLASS(IViewport, base::IPlugin, viewport)
 SCENE_CLASS(IPopupWindow, base::IPlugin, popupWindow)
 SCENE_CLASS(IViewportWindow, base::IPlugin, viewportWindow)

@@ -1,5 +1,6 @@
 #include "scene.h"
 
+#include "scene_animation.h"
 #include "scene_matrix.h"
 #include "scene_mesh.h"
 #include "scene_transform.h"
@@ -153,6 +154,13 @@ bool INode::hasTransformChannels() const {
     return findLayerPath(findAttribute(n_translate, false)) ||
            findLayerPath(findAttribute(n_scale, false)) ||
            findLayerPath(findAttribute(n_rotate, false));
+}
+
+void INode::getTransformKeyTimes(base::vector<base::TimeCode>& times) const {
+    times.clear();
+    for (const base::name_id name :
+         {base::name_id(n_translate), base::name_id(n_scale), base::name_id(n_rotate)})
+        mergeKeyTimes(findAttribute(name, false), times);
 }
 
 float getFieldOfView(float width, float height, float focalLength, base::u8 fit, float aspect) {

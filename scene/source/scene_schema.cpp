@@ -1,6 +1,6 @@
 #include "scene_schema.h"
 
-#include "scene.h"
+#include "scene_animation.h"
 #include "scene_options.h"
 
 #include "b_attribute_desc.h"

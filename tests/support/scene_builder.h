@@ -1,6 +1,6 @@
 #pragma once
 
-#include "scene.h"
+#include "scene_animation.h"
 #include "scene_factory.h"
 #include "scene_schema.h"
 
