@@ -38,24 +38,55 @@ enum Name : u64 {
     bufferView,
     bufferViews,
     byteLength,
+    commonMaterials,
     count,
+    extensions,
     images,
     indices,
+    input,
+    joints,
+    light,
     materials,
     meshes,
     mode,
     nodes,
     position,
     primitives,
+    samplers,
+    skins,
+    targets,
     uri,
     nameCount
 };
 } // namespace member
 
-constexpr string_view memberNames[member::nameCount] = {
-    "",           "accessors", "animations", "attributes", "buffers",   "bufferView", "bufferViews",
-    "byteLength", "count",     "images",     "indices",    "materials", "meshes",     "mode",
-    "nodes",      "POSITION",  "primitives", "uri"};
+constexpr string_view memberNames[] = {"",
+                                       "accessors",
+                                       "animations",
+                                       "attributes",
+                                       "buffers",
+                                       "bufferView",
+                                       "bufferViews",
+                                       "byteLength",
+                                       "KHR_materials_common",
+                                       "count",
+                                       "extensions",
+                                       "images",
+                                       "indices",
+                                       "input",
+                                       "joints",
+                                       "light",
+                                       "materials",
+                                       "meshes",
+                                       "mode",
+                                       "nodes",
+                                       "POSITION",
+                                       "primitives",
+                                       "samplers",
+                                       "skins",
+                                       "targets",
+                                       "uri"};
+static_assert(std::size(memberNames) == member::nameCount);
 
 /// The names of the objects that a place in the document lies in, from the root on, in one
 /// number. Arrays add nothing.
@@ -76,6 +107,7 @@ struct PrimitiveCounts {
     u64 mode = 4;
     u64 indices = absent; ///< numbers of accessors
     u64 position = absent;
+    u64 targets = 0;
 };
 
 /// A reference to bytes.
@@ -128,6 +160,7 @@ private:
     void startElement(u64 place);
     bool number(u64 value);
     void setUri(Resource& resource, string_view text);
+    u64 accessorCount(u64 accessor) const;
     u64 countTriangles(const PrimitiveCounts& primitive) const;
 
     const DocumentStream& stream_;
@@ -136,6 +169,8 @@ private:
     vector<u64> accessorCounts_;
     vector<u64> viewLengths_;
     vector<PrimitiveCounts> primitives_;
+    vector<u64> meshTargets_;   ///< by mesh
+    vector<u64> samplerInputs_; ///< accessors of key times
     vector<Resource> buffers_;
     vector<Resource> images_;
 };
@@ -144,13 +179,17 @@ void DocumentHandler::startElement(u64 place) {
     if (place == pathOf({member::nodes}))
         ++counts_.nodes;
     else if (place == pathOf({member::meshes}))
-        ++counts_.meshes;
+        meshTargets_.push_back(0);
     else if (place == pathOf({member::materials}))
         ++counts_.materials;
     else if (place == pathOf({member::animations}))
         ++counts_.animations;
+    else if (place == pathOf({member::skins}))
+        ++counts_.skins;
     else if (place == pathOf({member::meshes, member::primitives}))
         primitives_.emplace_back();
+    else if (place == pathOf({member::meshes, member::primitives, member::targets}))
+        meshTargets_.back() = std::max(meshTargets_.back(), ++primitives_.back().targets);
     else if (place == pathOf({member::accessors}))
         accessorCounts_.push_back(0);
     else if (place == pathOf({member::bufferViews}))
@@ -172,6 +211,13 @@ bool DocumentHandler::number(u64 value) {
     else if (place ==
              pathOf({member::meshes, member::primitives, member::attributes, member::position}))
         primitives_.back().position = value;
+    else if (place == pathOf({member::skins, member::joints}))
+        ++counts_.joints;
+    else if (place == pathOf({member::animations, member::samplers, member::input}))
+        samplerInputs_.push_back(value);
+    else if (place ==
+             pathOf({member::nodes, member::extensions, member::commonMaterials, member::light}))
+        ++counts_.lights;
     else if (place == pathOf({member::bufferViews, member::byteLength}))
         viewLengths_.back() = value;
     else if (place == pathOf({member::images, member::bufferView}))
@@ -184,10 +230,14 @@ void DocumentHandler::setUri(Resource& resource, string_view text) {
     resource.dataLength = stream_.skipped() == 0 ? 0 : text.size() + stream_.skipped();
 }
 
+/// Elements of the accessor, 0 if there is none of that number.
+u64 DocumentHandler::accessorCount(u64 accessor) const {
+    return accessor < accessorCounts_.size() ? accessorCounts_[accessor] : 0;
+}
+
 u64 DocumentHandler::countTriangles(const PrimitiveCounts& primitive) const {
-    const u64 accessor =
-        primitive.indices == PrimitiveCounts::absent ? primitive.position : primitive.indices;
-    const u64 corners = accessor < accessorCounts_.size() ? accessorCounts_[accessor] : 0;
+    const u64 corners = accessorCount(
+        primitive.indices == PrimitiveCounts::absent ? primitive.position : primitive.indices);
     switch (primitive.mode) {
     case 4: // list
         return corners / 3;
@@ -204,6 +254,11 @@ DocumentCounts DocumentHandler::counts() const {
     counts.images = images_.size();
     for (const PrimitiveCounts& primitive : primitives_)
         counts.triangles += countTriangles(primitive);
+    counts.meshes = meshTargets_.size();
+    for (const u64 targets : meshTargets_)
+        counts.targets += targets;
+    for (const u64 accessor : samplerInputs_)
+        counts.samples += accessorCount(accessor);
     return counts;
 }
 

@@ -20,7 +20,12 @@ struct DocumentCounts {
     base::u64 triangles = 0;
     base::u64 materials = 0;
     base::u64 images = 0;
+    base::u64 skins = 0;
+    base::u64 joints = 0;  ///< of all skins
+    base::u64 targets = 0; ///< morph targets, of each mesh once, whatever its primitives
     base::u64 animations = 0;
+    base::u64 samples = 0; ///< key times of all animated properties
+    base::u64 lights = 0;
 
     // The bytes of all files by kind, as they lie there: embedded data counts with its encoding.
     base::u64 jsonBytes = 0; ///< the text without the data, and what frames the parts

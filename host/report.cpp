@@ -118,7 +118,12 @@ void writeWritten(Writer& writer, const Output& written) {
     writeMember(writer, "triangles", counts.triangles);
     writeMember(writer, "materials", counts.materials);
     writeMember(writer, "images", counts.images);
+    writeMember(writer, "skins", counts.skins);
+    writeMember(writer, "joints", counts.joints);
+    writeMember(writer, "targets", counts.targets);
     writeMember(writer, "animations", counts.animations);
+    writeMember(writer, "samples", counts.samples);
+    writeMember(writer, "lights", counts.lights);
     writer.EndObject();
     writer.Key("bytes");
     writer.StartObject();

@@ -39,6 +39,17 @@ string dryRunLine(const RunRecord& record) {
     return line + counted(record.unexported.size(), "object") + " that can't be exported";
 }
 
+/// What the file has no place for, by type; empty if there is nothing.
+string unexportedText(const base::vector<ObjectName>& objects) {
+    base::map<string_view, u64> counts;
+    for (const ObjectName& object : objects)
+        ++counts[object.type];
+    string text;
+    for (const auto& [type, count] : counts)
+        text += base::format("{}{} {}", text.empty() ? ", without " : " and ", count, type);
+    return text;
+}
+
 string writtenLine(const RunRecord& record) {
     if (record.written.files.empty())
         return record.output + ": written, not counted as it is no regular file";
@@ -52,7 +63,17 @@ string writtenLine(const RunRecord& record) {
     line += ", " + counted(counts.triangles, "triangle");
     line += ", " + counted(counts.materials, "material");
     line += ", " + counted(counts.images, "image");
-    return line + ", " + counted(counts.animations, "animation");
+    if (counts.skins != 0)
+        line += base::format(", {} of {}", counted(counts.skins, "skin"),
+                             counted(counts.joints, "joint"));
+    if (counts.targets != 0)
+        line += ", " + counted(counts.targets, "morph target");
+    line += ", " + counted(counts.animations, "animation");
+    if (counts.animations != 0)
+        line += " of " + counted(counts.samples, "sample");
+    if (counts.lights != 0)
+        line += ", " + counted(counts.lights, "light");
+    return line + unexportedText(record.unexported);
 }
 
 } // namespace

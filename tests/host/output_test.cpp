@@ -48,21 +48,28 @@ const std::string documentHead = R"({
       {"attributes": {"POSITION": 1}, "indices": 0, "mode": -1},
       {"attributes": {"POSITION": 9}, "indices": 9}]},
     {"primitives": [
-      {"mode": 4, "indices": 3, "attributes": {"POSITION": 1}, "targets": [{"POSITION": 0}],
+      {"mode": 1, "indices": 3, "targets": [{"POSITION": 0}]},
+      {"mode": 4, "indices": 3, "attributes": {"POSITION": 1},
+       "targets": [{"POSITION": 0}, {"POSITION": 1, "NORMAL": 1}],
        "extensions": {"KHR_draco_mesh_compression": {"bufferView": 0, "attributes": {"POSITION": 0}}}}]}
   ],
-  "materials": [{"name": "a"}, {}], "animations": [{"channels": [{}, {}]}],
-  "nodes": [{"name": "data:\"}]{"}, {"name": "dat\u0061:,", "children": [2]},
+  "materials": [{"name": "a"}, {}], "animations": [{"channels": [{}, {}], "samplers": [
+    {"input": 1, "output": 0}, {"input": 1, "output": 2}, {"input": 9}]}],
+  "skins": [{"joints": [0, 2], "inverseBindMatrices": 1}, {"joints": [1]}],
+  "nodes": [{"name": "data:\"}]{"}, {"name": "dat\u0061:,", "children": [2],
+             "extensions": {"KHR_materials_common": {"light": 0}}},
             {"name": "\\\"data:\\", "matrix": [1, 0.5, -1e3]}])";
 
 TEST_F(OutputTest, CountsWhatADocumentHolds) {
     const rapidjson::Document report = reportOn(documentHead + "\n}");
     // Triangles: 12 / 3 in a list, 5 - 2 in a strip, 4 - 2 in a fan, and 6 / 3 compressed ones.
     expectJson(report["counts"], R"({"nodes": 3, "meshes": 2, "triangles": 11, "materials": 2,
-                                     "images": 0, "animations": 1})");
+                                     "images": 0, "skins": 2, "joints": 3, "targets": 2,
+                                     "animations": 1, "samples": 10, "lights": 1})");
     const std::string head = path("@/a.out: 1 file, ") + std::to_string(documentHead.size() + 2) +
                              " bytes, 3 nodes, 2 meshes, 11 triangles, 2 materials, 0 images, "
-                             "1 animation, ";
+                             "2 skins of 3 joints, 2 morph targets, 1 animation of 10 samples, "
+                             "1 light, ";
     EXPECT_TRUE(summary_.starts_with(head)) << summary_;
     EXPECT_TRUE(summary_.ends_with(" s\n")) << summary_;
 }
