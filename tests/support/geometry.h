@@ -49,6 +49,54 @@ inline Matrix operator*(const Matrix& a, const Matrix& b) {
     return product;
 }
 
+/// A rotation as x, y, z, w.
+using Quaternion = std::array<double, 4>;
+
+struct Placement {
+    Vector translation{0, 0, 0};
+    Quaternion rotation{0, 0, 0, 1};
+    Vector scale{1, 1, 1};
+};
+
+inline Matrix toMatrix(const Placement& placement) {
+    const auto& [x, y, z, w] = placement.rotation;
+    const auto& [sx, sy, sz] = placement.scale;
+    const auto& [tx, ty, tz] = placement.translation;
+    return {sx * (1 - 2 * (y * y + z * z)),
+            sx * 2 * (x * y + z * w),
+            sx * 2 * (x * z - y * w),
+            0,
+            sy * 2 * (x * y - z * w),
+            sy * (1 - 2 * (x * x + z * z)),
+            sy * 2 * (y * z + x * w),
+            0,
+            sz * 2 * (x * z + y * w),
+            sz * 2 * (y * z - x * w),
+            sz * (1 - 2 * (x * x + y * y)),
+            0,
+            tx,
+            ty,
+            tz,
+            1};
+}
+
+/// The shorter way between two unit quaternions.
+inline Quaternion slerp(const Quaternion& a, Quaternion b, double u) {
+    double cosine = a[0] * b[0] + a[1] * b[1] + a[2] * b[2] + a[3] * b[3];
+    if (cosine < 0) {
+        cosine = -cosine;
+        b = {-b[0], -b[1], -b[2], -b[3]};
+    }
+    const double angle = std::acos(std::min(cosine, 1.0)), sine = std::sin(angle);
+    const double ofA = sine < 1e-9 ? 1 - u : std::sin((1 - u) * angle) / sine;
+    const double ofB = sine < 1e-9 ? u : std::sin(u * angle) / sine;
+    Quaternion result;
+    for (size_t i = 0; i < 4; ++i) {
+        result[i] = ofA * a[i] + ofB * b[i];
+    }
+    return result;
+}
+
 /// An axis-aligned box; empty while the minimum is above the maximum.
 struct Box {
     static constexpr double infinity = std::numeric_limits<double>::infinity();

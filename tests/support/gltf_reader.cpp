@@ -201,25 +201,9 @@ Matrix localMatrix(const Value& node) {
     if (findMember(node, "matrix")) {
         return findNumbers<16>(node, "matrix", identity);
     }
-    const auto [tx, ty, tz] = findNumbers<3>(node, "translation", {0, 0, 0});
-    const auto [x, y, z, w] = findNumbers<4>(node, "rotation", {0, 0, 0, 1});
-    const auto [sx, sy, sz] = findNumbers<3>(node, "scale", {1, 1, 1});
-    return {sx * (1 - 2 * (y * y + z * z)),
-            sx * 2 * (x * y + z * w),
-            sx * 2 * (x * z - y * w),
-            0,
-            sy * 2 * (x * y - z * w),
-            sy * (1 - 2 * (x * x + z * z)),
-            sy * 2 * (y * z + x * w),
-            0,
-            sz * 2 * (x * z + y * w),
-            sz * 2 * (y * z - x * w),
-            sz * (1 - 2 * (x * x + y * y)),
-            0,
-            tx,
-            ty,
-            tz,
-            1};
+    return toMatrix({findNumbers<3>(node, "translation", {0, 0, 0}),
+                     findNumbers<4>(node, "rotation", {0, 0, 0, 1}),
+                     findNumbers<3>(node, "scale", {1, 1, 1})});
 }
 
 /// Runs `action` and puts `place` in front of the text of what it throws.
@@ -437,7 +421,15 @@ Primitive GltfFile::primitive(size_t mesh, size_t primitive) const {
     });
 }
 
-std::vector<NodeInstance> GltfFile::instances() const {
+std::vector<Matrix> GltfFile::localMatrices() const {
+    std::vector<Matrix> result;
+    for (size_t i = 0; i < count("nodes"); ++i) {
+        result.push_back(at(placeOf("nodes", i), [&] { return localMatrix(element("nodes", i)); }));
+    }
+    return result;
+}
+
+std::vector<NodeInstance> GltfFile::instances(const std::vector<Matrix>& localMatrices) const {
     std::vector<NodeInstance> result;
     std::vector<bool> met(count("nodes"), false);
     std::vector<std::pair<size_t, Matrix>> open;
@@ -456,8 +448,7 @@ std::vector<NodeInstance> GltfFile::instances() const {
         const Value& node = element("nodes", index);
         require(!met[index], placeOf("nodes", index) + " has two parents");
         met[index] = true;
-        const Matrix world =
-            at(placeOf("nodes", index), [&] { return worldFromParent * localMatrix(node); });
+        const Matrix world = worldFromParent * localMatrices.at(index);
         result.push_back({index, findInt(node, "mesh", -1), world});
         push(findMember(node, "children"), world);
     }

@@ -57,8 +57,12 @@ public:
     AccessorValues accessor(size_t index) const;
     /// Throws also if an index passes the vertices or an attribute differs in length.
     Primitive primitive(size_t mesh, size_t primitive) const;
+    /// The transforms of all nodes relative to their parents, as the nodes themselves tell them.
+    std::vector<Matrix> localMatrices() const;
     /// The nodes of the default scene, parents first. Throws if a node is met twice.
-    std::vector<NodeInstance> instances() const;
+    std::vector<NodeInstance> instances() const { return instances(localMatrices()); }
+    /// The same with other transforms relative to the parents, one for each node of the file.
+    std::vector<NodeInstance> instances(const std::vector<Matrix>& localMatrices) const;
 
 private:
     GltfFile(std::string_view text, std::optional<Bytes> binary,

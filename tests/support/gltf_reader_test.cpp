@@ -1,4 +1,5 @@
 #include "gltf_faults.h"
+#include "gltf_pose.h"
 #include "gltf_reader.h"
 #include "gltf_statistics.h"
 
@@ -189,6 +190,70 @@ TEST(GltfReader, DecodesDraco) {
     ASSERT_EQ(faults.size(), 1U);
     EXPECT_EQ(faults[0].kind, "draco-count");
     EXPECT_EQ(faults[0].text, "/accessors/2: declared 15 elements, the stream has 12");
+}
+
+/// A triangle on two joints, the second two units above the first and turned by 90 degrees about Z
+/// within two seconds, while a target lifts all vertices by 1 along Z. The node of the mesh stands
+/// elsewhere, which means nothing for skins.
+const std::string rigJson = R"({"asset":{"version":"2.0"},"scenes":[{"nodes":[0,1]}],
+"nodes":[{"mesh":0,"skin":0,"translation":[100,0,0]},{"children":[2]},{"translation":[0,2,0]}],
+"skins":[{"joints":[1,2],"inverseBindMatrices":3}],
+"meshes":[{"weights":[0.25],"primitives":[{"attributes":{"POSITION":0,"JOINTS_0":1,"WEIGHTS_0":2},
+"targets":[{"POSITION":7}]}]}],
+"animations":[{"channels":[{"sampler":0,"target":{"node":2,"path":"rotation"}},
+{"sampler":1,"target":{"node":0,"path":"weights"}}],
+"samplers":[{"input":4,"output":5},{"input":4,"output":6,"interpolation":"LINEAR"}]}],
+"accessors":[
+{"bufferView":0,"componentType":5126,"count":3,"type":"VEC3"},
+{"bufferView":0,"byteOffset":36,"componentType":5121,"count":3,"type":"VEC4"},
+{"bufferView":0,"byteOffset":48,"componentType":5126,"count":3,"type":"VEC4"},
+{"bufferView":0,"byteOffset":96,"componentType":5126,"count":2,"type":"MAT4"},
+{"bufferView":0,"byteOffset":224,"componentType":5126,"count":2,"type":"SCALAR"},
+{"bufferView":0,"byteOffset":232,"componentType":5126,"count":2,"type":"VEC4"},
+{"bufferView":0,"byteOffset":264,"componentType":5126,"count":2,"type":"SCALAR"},
+{"bufferView":0,"byteOffset":272,"componentType":5126,"count":3,"type":"VEC3"}],
+"bufferViews":[{"buffer":0,"byteLength":308}],"buffers":[{"byteLength":308}]})";
+
+Bytes rigBytes() {
+    const float h = std::sqrt(0.5f);
+    const float positions[] = {0, 0, 0, 1, 2, 0, 0, 4, 0};
+    const uint8_t joints[] = {0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0, 0};
+    const float weights[] = {1, 0, 0, 0, 1, 0, 0, 0, 0.5f, 0.5f, 0, 0};
+    const float inverses[] = {1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0, 0, 0,  0, 1,
+                              1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0, 0, -2, 0, 1};
+    const float times[] = {0, 2}, turns[] = {0, 0, 0, 1, 0, 0, h, h}, lifts[] = {0, 1};
+    const float differences[] = {0, 0, 1, 0, 0, 1, 0, 0, 1};
+    Bytes bytes;
+    append(bytes, positions, sizeof(positions));
+    append(bytes, joints, sizeof(joints));
+    append(bytes, weights, sizeof(weights));
+    append(bytes, inverses, sizeof(inverses));
+    append(bytes, times, sizeof(times));
+    append(bytes, turns, sizeof(turns));
+    append(bytes, lifts, sizeof(lifts));
+    append(bytes, differences, sizeof(differences));
+    return bytes;
+}
+
+TEST(GltfPose, MovesJointsAndTargets) {
+    const GltfFile file = GltfFile::fromBinary(makeGlb(padded(rigJson), rigBytes()));
+    EXPECT_EQ(keyTimes(file), (std::vector<double>{0, 2}));
+    const double h = std::sqrt(0.5);
+    // The third vertex lies half way between where the two joints take it: (0, 4) and (0, 2) plus
+    // two units along the turned axis.
+    const std::pair<double, std::vector<Vector>> rows[] = {
+        {-1, {{0, 0, 0}, {1, 2, 0}, {0, 4, 0}}},
+        {1, {{0, 0, 0.5}, {h, 2 + h, 0.5}, {-h, 3 + h, 0.5}}},
+        {2, {{0, 0, 1}, {0, 3, 1}, {-1, 3, 1}}},
+        {7, {{0, 0, 1}, {0, 3, 1}, {-1, 3, 1}}}};
+    for (const auto& [seconds, expected] : rows) {
+        const GltfPose pose(file, seconds);
+        const std::vector<Vector> drawn = pose.positions(pose.instances()[0], file.primitive(0, 0));
+        ASSERT_EQ(drawn.size(), 3u);
+        for (size_t v = 0; v < 3; ++v) {
+            EXPECT_LT(length(drawn[v] - expected[v]), 1e-6) << "vertex " << v << " at " << seconds;
+        }
+    }
 }
 
 } // namespace

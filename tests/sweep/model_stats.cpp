@@ -1,11 +1,11 @@
 // model_stats FILE: what a model file holds before any export, as JSON. Exit code 2 if it can't be
 // read. Reads with the assimp library and leaves polygons as they are.
 
+#include "model_world.h"
 #include "polygon.h"
 #include "stats_json.h"
 
 #include <assimp/Importer.hpp>
-#include <assimp/scene.h>
 
 #include <algorithm>
 #include <cstdio>
@@ -24,44 +24,6 @@ struct Allowances {
     /// Around the faces that can't be missing.
     Box innerBounds;
 };
-
-Matrix toMatrix(const aiMatrix4x4& m) {
-    return {m.a1, m.b1, m.c1, m.d1, m.a2, m.b2, m.c2, m.d2,
-            m.a3, m.b3, m.c3, m.d3, m.a4, m.b4, m.c4, m.d4};
-}
-
-double unitScaleFactor(const aiMetadata& metadata) {
-    double factor = 1;
-    float narrow = 1;
-    if (metadata.Get("UnitScaleFactor", narrow)) {
-        factor = narrow;
-    } else {
-        metadata.Get("UnitScaleFactor", factor);
-    }
-    return factor;
-}
-
-/// From the file's axes and unit to Y up and metres. COLLADA and 3DS files carry this turn in
-/// their root node already, and files of other formats are taken as they are.
-Matrix worldFromFile(const aiScene& scene, std::string_view extension) {
-    if (extension != "fbx" || !scene.mMetaData) {
-        return {1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1};
-    }
-    const double metres = 0.01 * unitScaleFactor(*scene.mMetaData);
-    int upAxis = 1;
-    int upSign = 1;
-    scene.mMetaData->Get("UpAxis", upAxis);
-    scene.mMetaData->Get("UpAxisSign", upSign);
-    const double up = upSign < 0 ? -metres : metres;
-    switch (upAxis) {
-    case 0: // (x, y, z) -> (-y, x, z)
-        return {0, up, 0, 0, -up, 0, 0, 0, 0, 0, metres, 0, 0, 0, 0, 1};
-    case 2: // (x, y, z) -> (x, z, -y)
-        return {metres, 0, 0, 0, 0, 0, -up, 0, 0, up, 0, 0, 0, 0, 0, 1};
-    default:
-        return {metres, 0, 0, 0, 0, up, 0, 0, 0, 0, up, 0, 0, 0, 0, 1};
-    }
-}
 
 void addFace(Totals& totals, Allowances& allowances, const std::vector<Vector>& corners) {
     if (corners.size() < 3) {
@@ -149,14 +111,9 @@ int main(int argc, char** argv) {
         std::fprintf(stderr, "model_stats: %s: %s\n", argv[1], importer.GetErrorString());
         return 2;
     }
-    const std::string_view path = argv[1];
-    std::string extension(path.substr(path.rfind('.') + 1));
-    for (char& c : extension) {
-        c = static_cast<char>(c >= 'A' && c <= 'Z' ? c - 'A' + 'a' : c);
-    }
     Model model;
     std::vector<bool> met(scene->mNumMeshes, false);
-    addNode(model, met, *scene, *scene->mRootNode, worldFromFile(*scene, extension));
+    addNode(model, met, *scene, *scene->mRootNode, worldFromFile(*scene, lowerExtension(argv[1])));
     print(model);
     return 0;
 }
