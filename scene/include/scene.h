@@ -195,8 +195,8 @@ inline ObjectCreator<T> objectCreator =
     return new T(std::move(desc), factory, id);
 };
 
-/// The path by which `attribute` is linked to an animation layer, through other links if need be;
-/// its root is the layer. Null if it is no such link.
+/// The path by which `attribute` is linked to an output of an animation layer, through other links
+/// if need be; its root is the layer. Null if it is no such link.
 const base::AttribPath* findLayerPath(const base::Attribute* attribute);
 
 /// Field of view in radians of a sensor of `width` times `height` at `focalLength`, all in the

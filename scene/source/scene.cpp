@@ -50,7 +50,7 @@ const base::AttribPath* findLayerPath(const base::Attribute* attribute) {
         const base::IPlugin* root = link ? link->path().root() : nullptr;
         if (!root)
             return nullptr;
-        if (root->typeName() == animLayer_schema::n_kind)
+        if (root->typeName() == animLayer_schema::n_kind && findOutputIndex(link->path()))
             return &link->path();
         attribute = findPathEnd(link->path());
     }

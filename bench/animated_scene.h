@@ -1,0 +1,21 @@
+#pragma once
+
+#include "scenes.h"
+
+namespace bench {
+
+/// So many nodes below the root, moving, turning and growing: each with three channels of 100
+/// linear keys over `frameCount` frames of 1/30 second, of one clip that plays from 0 on.
+struct AnimatedScene {
+    AnimatedScene(base::u32 nodeCount, base::u32 frameCount);
+
+    ScenePtr scene;
+    // One of each for each node.
+    base::vector<scene::IKeyframeChannel*> translations, scales, rotations;
+    base::u32 frameCount;
+};
+
+/// Evaluates all channels at all frames and returns the sum of what they yield.
+double evaluateAll(const AnimatedScene& animated);
+
+} // namespace bench
