@@ -1,10 +1,12 @@
 #include "assimp/import_geometry.h"
 
+#include "assimp/deformation.h"
 #include "assimp/import_polygons.h"
 #include "assimp/library_text.h"
 #include "assimp/vertex_selection.h"
 
 #include "b_log.h"
+#include "scene_mesh_index.h"
 #include "scene_schema.h"
 
 #include <assimp/mesh.h>
@@ -54,6 +56,11 @@ void GeometryFaults::report(const base::string& path) const {
          "assimp |{}| Found {} tangents without a direction, any are taken!");
     tell(base::logWarning, colorsOutOfRange,
          "assimp |{}| Found {} colors with components outside 0 to 1, the nearest are taken!");
+    tell(base::logWarning, brokenTargets,
+         "assimp |{}| Left out {} morph targets with a wrong number of vertices!");
+    tell(base::logWarning, stages,
+         "assimp |{}| Found {} morph targets that are stages on the way to another, their weights "
+         "stay at 0!");
 }
 
 vector<vec4f> readColors(const aiColor4D* elements, const VertexSelection& selection,
@@ -125,10 +132,32 @@ base::ref<base::IPlugin> importPoints(const aiMesh& mesh, vector<u32> vertices,
     return object;
 }
 
+/// Makes the mesh of the polygons; a morph over it if it has targets.
+base::ref<base::IPlugin> importDeformed(const aiMesh& mesh, const GeometrySettings& settings,
+                                        MeshFaces faces, vector<vec3f> positions,
+                                        Deformation deformation, base::PluginFactory& factory,
+                                        GeometryFaults& faults) {
+    base::ref<base::IPlugin> object = createObject(factory, scene::mesh_schema::n_kind, mesh);
+    vector<u32> motions;
+    if (!deformation.isEmpty())
+        motions = deformation.findMotions(mesh.mNumVertices);
+    const vector<u32> vertexOfPosition = importPolygons(
+        mesh, settings, std::move(faces), std::move(positions), motions, *object, faults);
+    if (!deformation.joints.starts.empty())
+        writeJoints(deformation.joints, vertexOfPosition, *object);
+    const bool isMorphBase = !deformation.targets.empty();
+    if (settings.multiIndex == Presence::never)
+        scene::convertToSingleIndex(*object, isMorphBase);
+    if (isMorphBase)
+        return makeMorph(std::move(deformation.targets), vertexOfPosition, object, factory);
+    return object;
+}
+
 } // namespace
 
 GeometryObjects importGeometry(const aiMesh& mesh, const GeometrySettings& settings,
-                               base::PluginFactory& factory, GeometryFaults& faults) {
+                               VertexJoints joints, bool inGroups, base::PluginFactory& factory,
+                               GeometryFaults& faults) {
     vector<vec3f> positions = readPositions(mesh, faults);
     MeshFaces faces = collectFaces(mesh, positions, settings.flip);
     if (settings.meshes)
@@ -143,8 +172,11 @@ GeometryObjects importGeometry(const aiMesh& mesh, const GeometrySettings& setti
     if (settings.points && !faces.points.empty())
         points = importPoints(mesh, std::move(faces.points), positions, factory);
     if (settings.meshes && !faces.corners.empty()) {
-        polygons = createObject(factory, scene::mesh_schema::n_kind, mesh);
-        importPolygons(mesh, settings, std::move(faces), std::move(positions), *polygons, faults);
+        Deformation deformation{std::move(joints), {}};
+        if (deformation.isEmpty())
+            deformation.targets = readVertexTargets(mesh, positions, settings, inGroups, faults);
+        polygons = importDeformed(mesh, settings, std::move(faces), std::move(positions),
+                                  std::move(deformation), factory, faults);
     }
     GeometryObjects objects;
     for (const base::ref<base::IPlugin>& object : {polygons, lines, points})

@@ -1,5 +1,7 @@
 #pragma once
 
+#include "assimp/vertex_joints.h"
+
 #include "b_factory.h"
 #include "scene_options.h"
 
@@ -31,6 +33,8 @@ struct GeometryFaults {
     base::u64 zeroNormals = 0;
     base::u64 zeroTangents = 0;
     base::u64 colorsOutOfRange = 0;
+    base::u64 brokenTargets = 0;
+    base::u64 stages = 0; ///< morph targets that are none but steps on the way to another
 
     /// Logs one line for each kind that occurred.
     void report(const base::string& path) const;
@@ -54,7 +58,12 @@ base::vector<base::vec4f> readColors(const aiColor4D* elements, const VertexSele
 ///
 /// Either way these vertices make a manifold, see `separateFans`: copies of positions, or of
 /// vertices where these are shared, keep faces apart that merely touch.
+///
+/// Vertices at one place that are deformed differently do not weld. A mesh with `joints` gets its
+/// first joints set and no morph targets. In the place of any other with targets a `morph` object
+/// over it stands in the list. `inGroups`: see `readVertexTargets`.
 GeometryObjects importGeometry(const aiMesh& mesh, const GeometrySettings& settings,
-                               base::PluginFactory& factory, GeometryFaults& faults);
+                               VertexJoints joints, bool inGroups, base::PluginFactory& factory,
+                               GeometryFaults& faults);
 
 } // namespace assimp

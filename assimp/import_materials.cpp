@@ -2,6 +2,7 @@
 
 #include "b_string_convert.h"
 #include "scene_mesh.h"
+#include "scene_schema.h"
 #include "stream/b_fs.h"
 
 #include <assimp/material.h>
@@ -63,7 +64,9 @@ MaterialImport::MaterialImport(const aiScene& source, const string& path,
           factory) {}
 
 void MaterialImport::assign(const aiMesh& mesh, const GeometryObjects& objects) {
-    for (const base::ref<base::IPlugin>& object : objects) {
+    for (const base::ref<base::IPlugin>& listed : objects) {
+        base::IPlugin* base = findObject(*listed, scene::morph_schema::n_baseMesh);
+        base::IPlugin* object = base ? base : listed.get();
         const base::ref<base::IPlugin> material = materialOf(mesh, hasCoordinates(*object));
         if (!material)
             continue;

@@ -1,11 +1,11 @@
 #include "assimp/import_polygons.h"
 
+#include "assimp/attribute_writing.h"
 #include "assimp/library_text.h"
 #include "assimp/manifold.h"
 #include "assimp/vertex_frames.h"
 #include "assimp/vertex_selection.h"
 
-#include "scene_mesh_index.h"
 #include "scene_schema.h"
 #include "scene_weld.h"
 
@@ -25,16 +25,6 @@ using scene::mesh_schema;
 using scene::Presence;
 
 namespace {
-
-/// Appends an item to one of the lists of a mesh.
-template <class Schema>
-AttribMap& appendItem(AttribMap& mesh, const scene::SchemaAttribute<scene::Items>& list) {
-    base::AttribArray& items = write(mesh, list);
-    items.setTypeName(Schema::n_kind);
-    auto item = std::make_unique<AttribMap>(mesh.factory(), Schema::n_kind);
-    items.append(item.get());
-    return *item.release();
-}
 
 template <class T>
 vector<T> elementsAt(const vector<T>& elements, const vector<u32>& indices) {
@@ -56,15 +46,17 @@ struct ChannelIndices {
 class PolygonImport {
 public:
     PolygonImport(const aiMesh& mesh, const GeometrySettings& settings, MeshFaces faces,
-                  vector<vec3f> positions, AttribMap& object, GeometryFaults& faults)
+                  vector<vec3f> positions, const vector<u32>& motions, AttribMap& object,
+                  GeometryFaults& faults)
         : mesh_(mesh), settings_(settings), faces_(std::move(faces)),
-          positions_(std::move(positions)), object_(object), faults_(faults),
+          positions_(std::move(positions)), motions_(motions), object_(object), faults_(faults),
           computesNormals_(settings.normals == Presence::always && !mesh.mNormals),
           computesTangents_(settings.tangents == Presence::always && !mesh.mTangents &&
                             hasNormals() && mesh.mTextureCoords[0]),
           perCorner_(!faces_.sharesVertices || computesNormals_ || computesTangents_) {}
 
-    void run() {
+    /// The vertex behind each position if there are motions.
+    vector<u32> run() {
         selectVertices();
         settlePositions();
         writeNormalsAndTangents();
@@ -76,8 +68,7 @@ public:
             separateVertices();
         writePositions();
         writePrimitive();
-        if (settings_.multiIndex == Presence::never)
-            scene::convertToSingleIndex(object_);
+        return std::move(vertexOfPosition_);
     }
 
 private:
@@ -124,13 +115,15 @@ private:
     const GeometrySettings& settings_;
     MeshFaces faces_;
     vector<vec3f> positions_; ///< of assimp's vertices, then of the scene mesh
+    const vector<u32>& motions_;
     AttribMap& object_;
     GeometryFaults& faults_;
     bool computesNormals_;
     bool computesTangents_;
     bool perCorner_; ///< arrays but the positions have one element per corner, else per position
-    VertexSelection selection_;   ///< what the elements of these arrays are read from
-    vector<u32> positionIndices_; ///< of the corners
+    VertexSelection selection_;    ///< what the elements of these arrays are read from
+    vector<u32> positionIndices_;  ///< of the corners
+    vector<u32> vertexOfPosition_; ///< empty without motions
     vector<ChannelIndices> channels_;
 };
 
@@ -167,9 +160,17 @@ void PolygonImport::selectSharedVertices() {
 void PolygonImport::settlePositions() {
     if (!selection_.isWhole)
         positions_ = elementsAt(positions_, selection_.vertices);
+    if (!motions_.empty())
+        vertexOfPosition_ = selection_.vertices;
     if (!perCorner_)
         return;
     scene::Welding welding = scene::weld(positions_);
+    if (!motions_.empty()) {
+        const vector<u32> motions = elementsAt(motions_, selection_.vertices);
+        welding = scene::weldRows({welding.numbers.cbegin(), motions.cbegin()},
+                                  static_cast<u32>(motions.size()));
+        vertexOfPosition_ = elementsAt(vertexOfPosition_, welding.firsts);
+    }
     positions_ = elementsAt(positions_, welding.firsts);
     positionIndices_ = std::move(welding.numbers);
 }
@@ -298,14 +299,19 @@ void PolygonImport::separateVertices() {
     }
     const u32 copiesEnd = separateFans(vertices, vertexCount, faces_);
     positions_.resize(positionCount + copiesEnd - vertexCount);
+    if (!motions_.empty())
+        vertexOfPosition_.resize(positions_.size());
     vec3f* positions = positions_.data();
     u32* indices = positionIndices_.data();
+    u32* origins = vertexOfPosition_.data();
     for (u32 c = 0; c < cornerCount; ++c) {
         const u32 vertex = std::as_const(vertices)[c];
         if (vertex < vertexCount)
             continue;
         const u32 copy = positionCount + vertex - vertexCount;
         positions[copy] = positions[indices[c]];
+        if (origins)
+            origins[copy] = origins[indices[c]];
         indices[c] = copy;
     }
 }
@@ -353,9 +359,12 @@ base::string textureSetName(const aiMesh& mesh, u32 channel) {
     return names.back();
 }
 
-void importPolygons(const aiMesh& mesh, const GeometrySettings& settings, MeshFaces faces,
-                    vector<vec3f> positions, AttribMap& object, GeometryFaults& faults) {
-    PolygonImport(mesh, settings, std::move(faces), std::move(positions), object, faults).run();
+vector<u32> importPolygons(const aiMesh& mesh, const GeometrySettings& settings, MeshFaces faces,
+                           vector<vec3f> positions, const vector<u32>& motions, AttribMap& object,
+                           GeometryFaults& faults) {
+    return PolygonImport(mesh, settings, std::move(faces), std::move(positions), motions, object,
+                         faults)
+        .run();
 }
 
 } // namespace assimp

@@ -1,15 +1,11 @@
 #include "assimp/importer.h"
 
-#include "assimp/import_axes.h"
-#include "assimp/import_geometry.h"
-#include "assimp/import_materials.h"
-#include "assimp/import_nodes.h"
+#include "assimp/import_scene.h"
 #include "assimp/library_text.h"
 #include "assimp/ply_header.h"
 
 #include "b_log.h"
 #include "b_string_convert.h"
-#include "scene_image_record.h"
 #include "scene_schema.h"
 #include "stream/b_fs.h"
 
@@ -19,7 +15,7 @@
 #include <assimp/scene.h>
 
 #include <algorithm>
-#include <optional>
+#include <memory>
 
 namespace assimp {
 
@@ -151,34 +147,6 @@ std::unique_ptr<aiScene> readFile(const base::string& path, bool materials, base
     return nullptr;
 }
 
-/// The objects of every mesh of the file, with their materials unless `materials` is null. Each
-/// mesh is freed as soon as it has been taken over.
-base::vector<GeometryObjects> importMeshes(aiScene& source, const GeometrySettings& settings,
-                                           base::PluginFactory& factory, MaterialImport* materials,
-                                           const base::string& path) {
-    base::vector<GeometryObjects> geometry;
-    GeometryFaults faults;
-    for (base::u32 i = 0; i < source.mNumMeshes; ++i) {
-        geometry.push_back(importGeometry(*source.mMeshes[i], settings, factory, faults));
-        if (materials)
-            materials->assign(*source.mMeshes[i], geometry.back());
-        delete source.mMeshes[i];
-        source.mMeshes[i] = nullptr;
-    }
-    faults.report(path);
-    if (materials)
-        materials->faults().report(path);
-    return geometry;
-}
-
-/// Makes the scene keep an object of the import's as long as it lives.
-void keep(base::IPlugin& scene, const base::ref<base::IPlugin>& object) {
-    const base::name_id name = base::nameServer().id("importedPictures");
-    scene.attribute<base::ref<base::IPlugin>>(name) = object;
-    base::Attribute& attribute = *scene.findAttribute(name);
-    attribute.setFlags(attribute.flags() | base::attribTransient);
-}
-
 } // namespace
 
 AssimpImporterDesc::AssimpImporterDesc() {
@@ -220,30 +188,7 @@ bool AssimpImporter::load(base::PluginFactory& scene, const base::string& path) 
                         path, source ? "It has no nodes." : base::string(base::trimmed(error)));
         return false;
     }
-    if (source->mNumMeshes == 0)
-        base::log().log(base::logIO, base::logWarning, "assimp |{}| The file has no geometry!",
-                        path);
-    std::optional<MaterialImport> materials;
-    if (hasMaterials)
-        materials.emplace(*source, path, *this, scene);
-    const base::vector<GeometryObjects> geometry = importMeshes(
-        *source, GeometrySettings(*this), scene, materials ? &*materials : nullptr, path);
-    const base::string extension = base::toLower(base::fs::extension(path));
-    const SceneAxes axes = readAxes(*source, extension == "dae" || extension == "3ds");
-    base::ref<base::IPlugin> root =
-        importNodes(*source->mRootNode, axes.transform, geometry, scene);
-
-    using Schema = scene::scene_schema;
-    const base::ref<base::IPlugin> object = scene.create(Schema::n_kind);
-    write(*object, Schema::n_name) = base::fs::stem(path);
-    write(*object, Schema::n_root) = std::move(root);
-    if (axes.upAxis != Schema::n_upAxis.defaultValue)
-        write(*object, Schema::n_upAxis) = axes.upAxis;
-    if (materials) {
-        scene::setPictureFiles(*object, materials->pictureFiles());
-        if (materials->pictures())
-            keep(*object, materials->pictures());
-    }
+    importScene(*source, *this, path, scene);
     return true;
 }
 

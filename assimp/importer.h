@@ -16,6 +16,10 @@ public:
     const base::string& exportExtensions() const override;
 };
 
+/// A bool attribute of this importer that is no setting of importers in general, so that it has no
+/// default: if it is there and true, only the first of a file's animations is read.
+inline constexpr char firstAnimationSetting[] = "importFirstAnimation";
+
 /// Reads one file. Its settings do the following; those not listed have no effect:
 ///
 /// | setting | effect |
@@ -29,6 +33,11 @@ public:
 /// | `importTangents` | the same; they need normals, and texture coordinates to be computed |
 /// | `flipNormals` | faces are wound the other way, normals negated |
 /// | `importMaterials` | materials and their textures are read |
+/// | `importSkeletons` | meshes with bones are bound to their joints |
+/// | `importAnimations` | animations and morph targets' weights become one layer of clips |
+/// | `importBakedAnimations` | keys on every frame in place of the file's |
+/// | `importFirstAnimation` | see `firstAnimationSetting` |
+/// | `importLights`, `importCameras` | the nodes' lights and cameras are read |
 /// | `resourcePaths` | an array of folders in which textures are looked for too |
 ///
 /// No format of the library's gives edges apart from line faces, surfaces or subdivision as such,

@@ -4,7 +4,8 @@
 Uses what real content uses: a deep tree of named nodes, meshes that many nodes share, polygons of
 three, four and many corners (concave ones too), normals, texture coordinates and colours at the
 vertices. Most surfaces are white paint under these colours; a few have materials with more to them:
-maps, gloss, transparency, light of their own.
+maps, gloss, transparency, light of their own. The beams of the lamp turn, the boat rides on the
+swell, and a flag on a chain of joints waves.
 
     make_lighthouse.py [FOLDER]
 
@@ -264,6 +265,7 @@ MATERIALS = {material.name: material for material in (
     Material("Water", shininess=120, bump_map="ripples"),
     Material("Glass", shininess=400, opacity=0.3),
     Material("Light", emission=colour("lamp")),
+    Material("Beam", emission=colour("lamp", 0.6), opacity=0.25),
     Material("Metal", shininess=30),
     Material("Signboard", colour_map="signboard", cut_out=True),
 )}
@@ -280,6 +282,7 @@ class Mesh:
         self.name = name
         self.material = material
         self.textured = bool(MATERIALS[material].maps())
+        self.skeleton = None  # a Skeleton, if the mesh follows joints
         self.polygons = []
         self.pools = {"position": {}, "normal": {}, "uv": {}, "colour": {}}
 
@@ -521,6 +524,44 @@ def lamp():
     return mesh
 
 
+def beam():
+    """A widening beam along +X."""
+    mesh = Mesh("beam", material="Beam")
+    near, far = ([(x, y, z) for y, _, z in ring(10, radius, 0)]
+                 for x, radius in ((0.45, 0.12), (6, 0.75)))
+    for i in range(10):
+        k = (i + 1) % 10
+        mesh.face([near[k], near[i], far[i], far[k]], colour("lamp"))
+    return mesh
+
+
+class Skeleton:
+    """A chain of joints along +X, evenly spaced; between two of them both pull at the vertices."""
+
+    def __init__(self, root, count, spacing):
+        self.joints = [f"{root}_{k + 1}" for k in range(count)]
+        self.spacing = spacing
+
+    def weights(self, x):
+        """Pairs of a joint's number and its weight."""
+        place = min(max(x / self.spacing, 0), len(self.joints) - 1)
+        first = int(place)
+        pairs = [(first, 1 - (place - first)), (first + 1, place - first)]
+        return [(joint, weight) for joint, weight in pairs if weight > 0]
+
+
+def flag():
+    """Ten stripes from the pole at the origin along +X; two sides, a little apart."""
+    mesh = Mesh("flag")
+    mesh.skeleton = Skeleton("Flag_Joint", 5, 0.35)
+    for k in range(10):
+        x0, x1 = 0.17 * k, 0.17 * (k + 1)
+        paint = colour("red" if k % 4 < 2 else "white")
+        mesh.face([(x0, 0, 0.01), (x1, 0, 0.01), (x1, 0.7, 0.01), (x0, 0.7, 0.01)], paint)
+        mesh.face([(x1, 0, -0.01), (x0, 0, -0.01), (x0, 0.7, -0.01), (x1, 0.7, -0.01)], paint)
+    return mesh
+
+
 def lantern_roof():
     mesh = Mesh("lantern_roof")
     eaves = ring(8, 1.22, 0, 0.5)
@@ -719,10 +760,15 @@ def boat_rig():
 
 
 class Node:
-    def __init__(self, name, move=None, turn=0.0, scale=None, mesh=None, matrix=None):
+    """`turn` is an angle about Y, `motion` the keys of that angle or, where `lifts` is set, of the
+    place along Y, evenly spread over the time of the whole movement."""
+
+    def __init__(self, name, move=None, turn=0.0, scale=None, mesh=None, matrix=None, motion=None,
+                 lifts=False, joint=False):
         self.name = name
         self.move, self.turn, self.scale, self.mesh = move, turn, scale, mesh
         self.matrix = matrix
+        self.motion, self.lifts, self.joint = motion, lifts, joint
         self.children = []
 
     def add(self, *arguments, **options):
@@ -741,12 +787,21 @@ def add_lantern(gallery):
     lantern.add("Lantern_Wall", mesh="lantern_wall")
     lantern.add("Lantern_Glass", mesh="lantern_glass")
     lantern.add("Lamp", (0, 1.0, 0), mesh="lamp")
+    beams = lantern.add("Beams", (0, 1.0, 0), motion=[22.5 * k for k in range(17)])
+    for k in range(2):
+        beams.add(f"Beam_{k + 1}", turn=180 * k, mesh="beam")
     mullions = lantern.add("Mullions", (0, 0.5, 0))
     for k in range(8):
         mullions.add(f"Mullion_{k + 1}", polar(0.87, 45 * k + 22.5), 45 * k + 22.5,
                      (0.8, 1.22, 0.8), "fence_post")
     roof = lantern.add("Lantern_Roof", (0, 1.5, 0), mesh="lantern_roof")
-    roof.add("Finial", (0, 1.22, 0), mesh="finial")
+    joint = roof.add("Finial", (0, 1.22, 0), mesh="finial").add("Flag", (0, 0.35, 0), 40,
+                                                                mesh="flag")
+    for k in range(5):
+        # Each follows the one before it; the wave returns four times.
+        swing = [(4 + 5 * k) * math.sin(math.tau * (n / 16 - 0.22 * k)) for n in range(65)]
+        joint = joint.add(f"Flag_Joint_{k + 1}", (0.35 if k else 0, 0, 0), motion=swing,
+                          joint=True)
 
 
 def add_lighthouse(island):
@@ -849,7 +904,9 @@ def add_harbour(root):
         harbour.add(f"Pile_{k + 1}", (x, 0, z), mesh="pile")
     # Heels a little: turned by -25 degrees round Y, then by 5 degrees round X.
     a, b = math.radians(-25), math.radians(5)
-    boat = harbour.add("Boat", matrix=(
+    swell = harbour.add("Swell", (0, 0, 0), lifts=True,
+                        motion=[0.1 * math.sin(math.tau * n / 16) for n in range(33)])
+    boat = swell.add("Boat", matrix=(
         math.cos(a), 0, math.sin(a), 2.5,
         math.sin(b) * math.sin(a), math.cos(b), -math.sin(b) * math.cos(a), 0.05,
         -math.cos(b) * math.sin(a), math.sin(b), math.cos(b) * math.cos(a), 4.9,
@@ -876,7 +933,7 @@ def scene():
 
 def meshes():
     makers = (sea, beach, meadow, gear_base, tower_shaft, gallery_floor, gallery_rail,
-              lantern_wall, lantern_glass, lamp, lantern_roof, finial, window, door, cottage_walls,
+              lantern_wall, lantern_glass, lamp, beam, flag, lantern_roof, finial, window, door, cottage_walls,
               cottage_roof, chimney, pine, trunk, fence_post, fence_rail, stepping_stone,
               sign_board, pier, pile, boat_hull, boat_rig)
     result = [make() for make in makers]
@@ -1005,7 +1062,11 @@ def write_mesh(mesh):
 
 
 def write_instance(mesh, pad):
-    yield f'{pad}<instance_geometry url="#{mesh.name}">'
+    kind = "controller" if mesh.skeleton else "geometry"
+    suffix = "-skin" if mesh.skeleton else ""
+    yield f'{pad}<instance_{kind} url="#{mesh.name}{suffix}">'
+    if mesh.skeleton:
+        yield f"{pad}  <skeleton>#{mesh.skeleton.joints[0]}</skeleton>"
     end = "/>"
     if mesh.textured:
         end = ('><bind_vertex_input semantic="UV" input_semantic="TEXCOORD" input_set="0"/>'
@@ -1013,17 +1074,96 @@ def write_instance(mesh, pad):
     yield (f"{pad}  <bind_material><technique_common>"
            f'<instance_material symbol="surface" target="#{mesh.material}"{end}'
            "</technique_common></bind_material>")
-    yield f"{pad}</instance_geometry>"
+    yield f"{pad}</instance_{kind}>"
+
+
+def write_array(pad, identifier, element, values, stride, params):
+    yield f'{pad}<source id="{identifier}">'
+    yield (f'{pad}  <{element} id="{identifier}-array" count="{len(values)}">'
+           f"{' '.join(values)}</{element}>")
+    yield f"{pad}  <technique_common>"
+    yield (f'{pad}    <accessor source="#{identifier}-array" count="{len(values) // stride}"'
+           f' stride="{stride}">')
+    for name, kind in params:
+        yield f'{pad}      <param name="{name}" type="{kind}"/>'
+    yield f"{pad}    </accessor>"
+    yield f"{pad}  </technique_common>"
+    yield f"{pad}</source>"
+
+
+def write_skin(mesh):
+    skeleton, skin = mesh.skeleton, f"{mesh.name}-skin"
+    influences = [skeleton.weights(float(position[0])) for position in mesh.pools["position"]]
+    inverses = [f"1 0 0 {number(-skeleton.spacing * k)} 0 1 0 0 0 0 1 0 0 0 0 1".split()
+                for k in range(len(skeleton.joints))]
+    pad = " " * 8
+    yield f'    <controller id="{skin}" name="{skin}">'
+    yield f'      <skin source="#{mesh.name}">'
+    yield f"{pad}<bind_shape_matrix>1 0 0 0 0 1 0 0 0 0 1 0 0 0 0 1</bind_shape_matrix>"
+    yield from write_array(pad, f"{skin}-joints", "Name_array", skeleton.joints, 1,
+                           [("JOINT", "name")])
+    yield from write_array(pad, f"{skin}-inverses", "float_array", sum(inverses, []), 16,
+                           [("TRANSFORM", "float4x4")])
+    weights = [number(weight) for pairs in influences for _, weight in pairs]
+    yield from write_array(pad, f"{skin}-weights", "float_array", weights, 1,
+                           [("WEIGHT", "float")])
+    yield f"{pad}<joints>"
+    yield f'{pad}  <input semantic="JOINT" source="#{skin}-joints"/>'
+    yield f'{pad}  <input semantic="INV_BIND_MATRIX" source="#{skin}-inverses"/>'
+    yield f"{pad}</joints>"
+    yield f'{pad}<vertex_weights count="{len(influences)}">'
+    yield f'{pad}  <input semantic="JOINT" source="#{skin}-joints" offset="0"/>'
+    yield f'{pad}  <input semantic="WEIGHT" source="#{skin}-weights" offset="1"/>'
+    yield f"{pad}  <vcount>{' '.join(str(len(pairs)) for pairs in influences)}</vcount>"
+    joints = [joint for pairs in influences for joint, _ in pairs]
+    yield f"{pad}  <v>{' '.join(f'{joint} {i}' for i, joint in enumerate(joints))}</v>"
+    yield f"{pad}</vertex_weights>"
+    yield "      </skin>"
+    yield "    </controller>"
+
+
+SECONDS = 8  # of the whole movement
+
+
+def moving_nodes(node):
+    if node.motion:
+        yield node
+    for child in node.children:
+        yield from moving_nodes(child)
+
+
+def write_animation(node):
+    identifier, count, pad = f"{node.name}-motion", len(node.motion), " " * 6
+    times = [number(SECONDS * k / (count - 1)) for k in range(count)]
+    target = "place.Y" if node.lifts else "turn.ANGLE"
+    yield f'    <animation id="{identifier}">'
+    yield from write_array(pad, f"{identifier}-input", "float_array", times, 1,
+                           [("TIME", "float")])
+    yield from write_array(pad, f"{identifier}-output", "float_array",
+                           [number(value) for value in node.motion], 1,
+                           [(target.partition(".")[2], "float")])
+    yield from write_array(pad, f"{identifier}-interpolation", "Name_array", ["LINEAR"] * count, 1,
+                           [("INTERPOLATION", "name")])
+    yield f'      <sampler id="{identifier}-sampler">'
+    for semantic in ("INPUT", "OUTPUT", "INTERPOLATION"):
+        yield f'        <input semantic="{semantic}" source="#{identifier}-{semantic.lower()}"/>'
+    yield "      </sampler>"
+    yield f'      <channel source="#{identifier}-sampler" target="{node.name}/{target}"/>'
+    yield "    </animation>"
 
 
 def write_node(node, mesh_named, indent):
     pad = " " * indent
-    yield f'{pad}<node id="{node.name}" name="{node.name}" type="NODE">'
+    kind = f'sid="{node.name}" type="JOINT"' if node.joint else 'type="NODE"'
+    yield f'{pad}<node id="{node.name}" name="{node.name}" {kind}>'
     if node.matrix:
         yield f"{pad}  <matrix>{' '.join(map(number, node.matrix))}</matrix>"
     if node.move:
-        yield f"{pad}  <translate>{' '.join(map(number, node.move))}</translate>"
-    if node.turn:
+        place = ' sid="place"' if node.lifts else ""
+        yield f"{pad}  <translate{place}>{' '.join(map(number, node.move))}</translate>"
+    if node.motion and not node.lifts:
+        yield f'{pad}  <rotate sid="turn">0 1 0 {number(node.motion[0])}</rotate>'
+    elif node.turn:
         yield f"{pad}  <rotate>0 1 0 {number(node.turn)}</rotate>"
     if node.scale:
         yield f"{pad}  <scale>{' '.join(map(number, node.scale))}</scale>"
@@ -1056,9 +1196,12 @@ def write_document(images):
     yield from write_library("effects", MATERIALS.values(), write_effect)
     yield from write_library("materials", MATERIALS.values(), write_material)
     yield from write_library("geometries", parts, write_mesh)
+    yield from write_library("controllers", [mesh for mesh in parts if mesh.skeleton], write_skin)
+    root = scene()
+    yield from write_library("animations", moving_nodes(root), write_animation)
     yield "  <library_visual_scenes>"
     yield '    <visual_scene id="Scene" name="Scene">'
-    yield from write_node(scene(), {mesh.name: mesh for mesh in parts}, 6)
+    yield from write_node(root, {mesh.name: mesh for mesh in parts}, 6)
     yield "    </visual_scene>"
     yield "  </library_visual_scenes>"
     yield '  <scene><instance_visual_scene url="#Scene"/></scene>'

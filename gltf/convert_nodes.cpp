@@ -1,4 +1,6 @@
 #include "gltf/exporter.h"
+#include "gltf/index_attribute.h"
+#include "gltf/node_transform.h"
 #include "gltf/scene_kind.h"
 
 #include "scene_schema.h"
@@ -25,6 +27,8 @@ constexpr u32 maximumLevel = 4096;
 /// Nodes in the tree from which on a node that was met before is not repeated with all that is
 /// below it: shared nodes that share nodes multiply without end.
 constexpr u32 maximumRepeatedNodes = 1u << 20;
+/// A fault of a node's place beside those of its own transform.
+constexpr u32 animatedParent = scene::INode::faultParent << 1;
 
 void logNode(const IPlugin& node, int level, string_view text) {
     base::log().log(base::logScene, level, "gltf |{}| {}", node.getName(), text);
@@ -44,64 +48,9 @@ bool isPlacedByAnimation(const TreePosition* position) {
     return position != nullptr;
 }
 
-vec3f negated(const vec3f& v) {
-    return {-v.x, -v.y, -v.z};
-}
-
-/// `matrix` followed by the turn that takes the scene's up axis to Y.
-mat43 turnedUp(const mat43& matrix, u8 upAxis) {
-    const auto& [m, t] = matrix;
-    switch (upAxis) {
-    case 0:
-        return {{negated(m.r1), m.r0, m.r2}, {-t.y, t.x, t.z}};
-    case 2:
-        return {{m.r0, m.r2, negated(m.r1)}, {t.x, t.z, -t.y}};
-    default:
-        return matrix;
-    }
-}
-
-ref<GLTF::Node::Transform> makeMatrix(const mat43& matrix) {
-    const auto& [m, t] = matrix;
-    const float rows[16] = {m.r0.x, m.r0.y, m.r0.z, static_cast<float>(t.x),
-                            m.r1.x, m.r1.y, m.r1.z, static_cast<float>(t.y),
-                            m.r2.x, m.r2.y, m.r2.z, static_cast<float>(t.z),
-                            0,      0,      0,      1};
-    return base::makeRef<GLTF::Node::TransformMatrix>(rows, false);
-}
-
-ref<GLTF::Node::Transform> makeParts(const mat43& matrix) {
-    const auto [translation, rotation, scale] = scene::decomposeTransform(matrix);
-    auto parts = base::makeRef<GLTF::Node::TransformTRS>();
-    parts->translation = {translation.x, translation.y, translation.z};
-    parts->rotation = {rotation.x, rotation.y, rotation.z, rotation.w};
-    parts->scale = {scale.x, scale.y, scale.z};
-    return parts;
-}
-
 void setName(GLTF::Node& gltfNode, const IPlugin& node) {
     if (const string* name = find(node, scene::node_schema::n_name))
         gltfNode.name = *name;
-}
-
-/// The mesh that a skin or morph deforms, null if it has none.
-template <class Deformer>
-IPlugin* findBaseMesh(IPlugin& child) {
-    const auto* deformer = findClass<const Deformer>(child);
-    IPlugin* object = deformer ? findObject(*deformer, Deformer::Schema::n_baseMesh) : nullptr;
-    return object && object->typeName() == scene::mesh_schema::n_kind ? object : nullptr;
-}
-
-/// The slot of materials for a node and what is below it: its own, else that from above. A
-/// negative one lies past the end of every list.
-u32 readMaterialIndex(const IPlugin& node, u32 inherited) {
-    const base::Attribute* index = node.findAttribute(scene::node_schema::n_materialIndex);
-    if (!index)
-        return inherited;
-    if (index->type() == base::TypeTraits<u32>::n_name)
-        return *static_cast<const u32*>(index->data());
-    const base::i32* value = find(node, scene::node_schema::n_materialIndex);
-    return value ? static_cast<u32>(*value) : inherited;
 }
 
 /// True for the edges of a mesh: lines assigned to an object or to faces.
@@ -120,7 +69,6 @@ bool hasAssignment(const IPlugin& lines) {
 
 /// The transform of `node` below `parent`, null at the root.
 mat43 GLTFScenePlugin::findParentFromNode(const scene::INode& node, const TreePosition* parent) {
-    constexpr u32 animatedParent = scene::INode::faultParent << 1;
     const bool isFree = parent && !read(node, scene::node_schema::n_inheritsTransform);
     mat43 transform;
     u32 faults = 0;
@@ -132,39 +80,49 @@ mat43 GLTFScenePlugin::findParentFromNode(const scene::INode& node, const TreePo
     } else {
         faults = node.getTransform(transform, nullptr);
     }
-    if (faults == 0)
-        return transform;
-
-    u32& known = transformFaults_[&node];
-    const u32 added = faults & ~known;
-    known |= faults;
-    if ((added & scene::INode::faultNotFinite) != 0)
-        logNode(node, base::logWarning,
-                "The transform has values that are not finite, they are ignored.");
-    if ((added & scene::INode::faultParent) != 0)
-        logNode(node, base::logWarning,
-                "The transform can't be freed of its parent's, the parent is unknown or its "
-                "transform has no inverse.");
-    if ((added & animatedParent) != 0)
-        logNode(node, base::logWarning,
-                "The node does not inherit the transform of its parent, which is animated: it is "
-                "placed for the present time only!");
+    if (faults != 0)
+        logTransformFaults(node, faults);
     return transform;
 }
 
-ref<GLTF::Node> GLTFScenePlugin::convertRoot(const scene::INode& root, u8 upAxis) {
+/// Warns of an object, whose name stands for "{}". `fault` is a bit that tells the text from the
+/// others that there are for objects of its kind.
+void GLTFScenePlugin::warnOnce(const IPlugin& object, u32 fault, string_view text) {
+    u32& known = faults_[&object];
+    if ((known & fault) == 0)
+        base::log().log(base::logScene, base::logWarning, text, object.getName());
+    known |= fault;
+}
+
+void GLTFScenePlugin::logTransformFaults(const scene::INode& node, u32 faults) {
+    const std::pair<u32, const char*> texts[] = {
+        {scene::INode::faultNotFinite,
+         "gltf |{}| The transform has values that are not finite, they are ignored."},
+        {scene::INode::faultParent,
+         "gltf |{}| The transform can't be freed of its parent's, the parent is unknown or its "
+         "transform has no inverse."},
+        {animatedParent,
+         "gltf |{}| The node does not inherit the transform of its parent, which is animated: it "
+         "is placed for the present time only!"}};
+    for (const auto& [fault, text] : texts)
+        if ((faults & fault) != 0)
+            warnOnce(node, fault, text);
+}
+
+void GLTFScenePlugin::convertRoot(const scene::INode& root, u8 upAxis) {
     const TreePosition position{root,
                                 nullptr,
                                 1,
-                                readMaterialIndex(root, 0),
+                                readIndex(root, scene::node_schema::n_materialIndex, 0),
                                 root.hasTransformChannels(),
                                 findParentFromNode(root, nullptr)};
-    const auto gltfRoot = base::makeRef<GLTF::Node>();
     // Always a matrix: the turn of the axes can't be a part of animated values.
-    gltfRoot->transform = makeMatrix(turnedUp(position.parentFromNode, upAxis));
-    setName(*gltfRoot, root);
-    convertNode(*gltfRoot, position);
-    return gltfRoot;
+    gltfRoot_->transform = makeTransform(turnedUp(position.parentFromNode, upAxis));
+    setName(*gltfRoot_, root);
+    if (Joint* joint = findJoint(root))
+        *joint = {gltfRoot_, true};
+    convertNode(*gltfRoot_, position);
+    reportMissingJoints();
 }
 
 void GLTFScenePlugin::convertNode(GLTF::Node& gltfNode, const TreePosition& position) {
@@ -193,21 +151,39 @@ void GLTFScenePlugin::convertChildNode(GLTF::Node& gltfNode, IPlugin& child,
     const auto* node = findClass<const scene::INode>(child);
     if (!node || !mayPlace(*node, parent))
         return;
-    const auto gltfChild = base::makeRef<GLTF::Node>();
-    if (read(*node, scene::node_schema::n_isJoint))
-        nodeMap[node] = gltfChild.get();
-    ++nodeCount_;
+    const ref<GLTF::Node> gltfChild = placeNode(*node);
     setName(*gltfChild, *node);
 
-    const TreePosition position{*node,
-                                &parent,
-                                parent.level + 1,
-                                readMaterialIndex(*node, parent.materialIndex),
-                                node->hasTransformChannels(),
-                                findParentFromNode(*node, &parent)};
+    const TreePosition position{
+        *node,
+        &parent,
+        parent.level + 1,
+        readIndex(*node, scene::node_schema::n_materialIndex, parent.materialIndex),
+        node->hasTransformChannels(),
+        findParentFromNode(*node, &parent)};
     convertTransform(position, *gltfChild);
     gltfNode.children.push_back(gltfChild);
     convertNode(*gltfChild, position);
+}
+
+/// Null for a node that is no joint, as far as is known.
+GLTFScenePlugin::Joint* GLTFScenePlugin::findJoint(const scene::INode& node) {
+    if (nodeMap.empty())
+        return nullptr;
+    const auto joint = nodeMap.find(&node);
+    return joint != nodeMap.end() ? &joint->second : nullptr;
+}
+
+/// A node of the document for `node`; for a joint the one that its skins have.
+ref<GLTF::Node> GLTFScenePlugin::placeNode(const scene::INode& node) {
+    ++nodeCount_;
+    Joint* joint = read(node, scene::node_schema::n_isJoint) ? &nodeMap[&node] : findJoint(node);
+    if (!joint)
+        return base::makeRef<GLTF::Node>();
+    if (!joint->node)
+        joint->node = base::makeRef<GLTF::Node>();
+    joint->isPlaced = true;
+    return joint->node;
 }
 
 /// False, with a message, for a node that would make the tree endless, too deep or too large, and
@@ -218,7 +194,7 @@ bool GLTFScenePlugin::mayPlace(const scene::INode& child, const TreePosition& pa
         logNode(child, base::logError, "The node is a child of its own descendant, it is skipped!");
         return false;
     }
-    if (nodeMap.contains(&child)) {
+    if (const Joint* joint = findJoint(child); joint && joint->isPlaced) {
         logNode(child, base::logWarning,
                 "The joint is the child of several nodes, only the first place counts!");
         return false;
@@ -236,8 +212,20 @@ bool GLTFScenePlugin::mayPlace(const scene::INode& child, const TreePosition& pa
 }
 
 void GLTFScenePlugin::convertTransform(const TreePosition& position, GLTF::Node& gltfNode) {
-    gltfNode.transform = position.isAnimated ? makeParts(position.parentFromNode)
-                                             : makeMatrix(position.parentFromNode);
+    if (!position.isAnimated) {
+        gltfNode.transform = makeTransform(position.parentFromNode);
+        return;
+    }
+    scene::TransformParts parts;
+    if (!splitTransform(position.parentFromNode, parts))
+        logTransformFaults(position.node, scene::INode::faultNotFinite);
+    gltfNode.transform = makeTransform(parts);
+    if (!exportAnimations)
+        return;
+    base::vector<base::TimeCode> times;
+    position.node.getTransformKeyTimes(times);
+    if (!times.empty() && times.front() != times.back())
+        makeNodeAnimation(position, gltfNode, times);
 }
 
 GLTF::Node* GLTFScenePlugin::attachMesh(GLTF::Node& gltfNode, ref<GLTF::Mesh> mesh) {
@@ -251,37 +239,33 @@ GLTF::Node* GLTFScenePlugin::attachMesh(GLTF::Node& gltfNode, ref<GLTF::Mesh> me
     return holder.get();
 }
 
-/// Cameras, lights, hair, points and instancers leave no trace in the document.
+/// Cameras, hair, points and instancers leave no trace in the document.
 void GLTFScenePlugin::convertObject(GLTF::Node& gltfNode, IPlugin& child, u32 materialIndex) {
     const name_id kind = child.typeName();
     if (kind == scene::mesh_schema::n_kind) {
-        convertMeshChild(gltfNode, child, materialIndex, false);
+        if (auto* mesh = findClass<scene::IMesh>(child))
+            convertMeshChild(gltfNode, *mesh, materialIndex, false);
     } else if (kind == scene::lines_schema::n_kind) {
         convertLinesChild(gltfNode, child, materialIndex);
     } else if (kind == scene::skin_schema::n_kind) {
-        // The mesh in its rest pose; the holder gets no skin.
-        if (IPlugin* baseMesh = findBaseMesh<scene::ISkin>(child))
-            convertMeshChild(gltfNode, *baseMesh, materialIndex, false);
+        convertSkinChild(gltfNode, child, materialIndex);
     } else if (kind == scene::morph_schema::n_kind) {
-        // The mesh as it is without its targets.
-        if (IPlugin* baseMesh = findBaseMesh<scene::IMorph>(child))
-            convertMeshChild(gltfNode, *baseMesh, materialIndex, true);
+        convertMorphChild(gltfNode, child, materialIndex);
+    } else if (kind == scene::light_schema::n_kind) {
+        convertLightChild(gltfNode, child);
     }
 }
 
-void GLTFScenePlugin::convertMeshChild(GLTF::Node& gltfNode, IPlugin& child, u32 materialIndex,
-                                       bool withTargets) {
-    auto* mesh = findClass<scene::IMesh>(child);
-    if (!mesh)
-        return;
-    const auto [entry, isNew] = meshMap.try_emplace(mesh, nullptr);
+/// Returns the node that took the mesh, null if it gave nothing.
+GLTF::Node* GLTFScenePlugin::convertMeshChild(GLTF::Node& gltfNode, scene::IMesh& mesh,
+                                              u32 materialIndex, bool withTargets) {
+    const auto [entry, isNew] = meshMap.try_emplace(&mesh, nullptr);
     ref<GLTF::Mesh> gltfMesh = entry->second;
     if (isNew) {
-        gltfMesh = convertMesh(*mesh, materialIndex, withTargets);
+        gltfMesh = convertMesh(mesh, materialIndex, withTargets);
         entry->second = gltfMesh.get();
     }
-    if (gltfMesh)
-        attachMesh(gltfNode, std::move(gltfMesh));
+    return gltfMesh ? attachMesh(gltfNode, std::move(gltfMesh)) : nullptr;
 }
 
 void GLTFScenePlugin::convertLinesChild(GLTF::Node& gltfNode, IPlugin& child, u32 materialIndex) {

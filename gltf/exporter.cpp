@@ -1,6 +1,7 @@
 #include "gltf/exporter.h"
 
 #include "gltf/output_files.h"
+#include "gltf/scene_clock.h"
 #include "gltf/scene_kind.h"
 
 #include "b_log.h"
@@ -79,11 +80,12 @@ bool GLTFScenePlugin::exportScene(PluginFactory& sceneObjects, const string& pat
         return false;
 
     prepareObjects(sceneObjects);
-    const ref<GLTF::Node> gltfRoot =
-        convertRoot(*root, read(*sceneObject, scene::scene_schema::n_upAxis));
+    SceneClock(*sceneObject).tellLayers();
+    const ref<GLTF::Asset> asset = makeAsset();
+    convertRoot(*root, read(*sceneObject, scene::scene_schema::n_upAxis));
+    bakeAnimations(*asset, *sceneObject);
     const GLTF::Options options = makeOptions(path);
-    const ref<GLTF::Asset> asset = makeAsset(gltfRoot);
-    const ref<GLTF::Buffer> buffer = runPasses(*asset, options, gltfRoot);
+    const ref<GLTF::Buffer> buffer = runPasses(*asset, options, gltfRoot_);
     writeOutputFiles(*asset, options, *buffer,
                      textures.findPictureFiles(sceneObjects, *sceneObject), path);
     scene::storeImageRecords(*sceneObject, textures.makeRecords(*asset));
@@ -104,6 +106,8 @@ void GLTFScenePlugin::prepareObjects(PluginFactory& sceneObjects) {
         } else if (kind == scene::morph_schema::n_kind) {
             if (const IPlugin* baseMesh = findObject(*object, scene::morph_schema::n_baseMesh))
                 morphBases_.insert(baseMesh);
+        } else if (kind == scene::skin_schema::n_kind) {
+            gatherJoints(*object);
         } else if (kind == scene::bufferAdapter_schema::n_kind) {
             // One made in memory has not filled its outputs yet.
             object->afterLoad(object->desc()->version);
@@ -126,22 +130,29 @@ GLTF::Options GLTFScenePlugin::makeOptions(const string& path) const {
     return options;
 }
 
-ref<GLTF::Asset> GLTFScenePlugin::makeAsset(const ref<GLTF::Node>& gltfRoot) const {
+/// A document with a root node that is empty as yet.
+ref<GLTF::Asset> GLTFScenePlugin::makeAsset() {
     auto asset = base::makeRef<GLTF::Asset>();
     asset->metadata->copyright = exportCopyright;
-    asset->getDefaultScene().nodes.push_back(gltfRoot);
+    gltfRoot_ = base::makeRef<GLTF::Node>();
+    asset->getDefaultScene().nodes.push_back(gltfRoot_);
     return asset;
 }
 
 void GLTFScenePlugin::clearTables() {
     GLTF::Image::clearCache();
+    gltfRoot_.reset();
     nodeMap.clear();
+    expectedJoints_.clear();
     meshMap.clear();
     linesMap.clear();
+    nodeAnimations.clear();
+    morphAnimations.clear();
+    morphTargets_.clear();
     morphBases_.clear();
     walkedNodes_.clear();
     nodeCount_ = 0;
-    transformFaults_.clear();
+    faults_.clear();
     edgeMaterial_.reset();
     materialMap.clear();
     textures.clear();

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "GLTF/document.h"
+#include "gltf/animation_entries.h"
 #include "gltf/texture_export.h"
 #include "scene.h"
 #include "scene_factory.h"
@@ -15,7 +16,7 @@ struct TreePosition;
 /// export its members of the same names. The conversions are public so that each can be used by
 /// itself; they read the settings and the tables and add to the tables.
 ///
-/// The tables hold plain pointers: the document owns what they point at. The document borrows the
+/// The tables of geometry hold plain pointers: the document owns what they point at. It borrows the
 /// bulk arrays of the scene's objects until the data is packed, so nothing may change these
 /// meanwhile. Single-indexing and triangulation change the meshes of the scene in place.
 class GLTFScenePlugin final : public scene::SceneExportPlugin {
@@ -34,7 +35,7 @@ public:
     /// `position`: child nodes first, depth first, then the other objects in their order.
     void convertNode(GLTF::Node& gltfNode, const TreePosition& position);
     /// Sets the transform of `gltfNode`: a matrix, or translation, rotation and scale for a node
-    /// that is animated.
+    /// that is animated, which is entered into `nodeAnimations` then.
     void convertTransform(const TreePosition& position, GLTF::Node& gltfNode);
     /// Gives the mesh to `gltfNode` or, if that has one, to a new child of it. Returns the node
     /// that took it.
@@ -53,6 +54,12 @@ public:
     /// together, and without one if the target has no positions.
     bool convertMorphTarget(GLTF::Mesh& gltfMesh, const scene::IMesh& targetMesh,
                             const scene::IMesh& baseMesh, bool isWholeShape);
+    /// A new skin for a node with `gltfMesh`, made of the base mesh. Null, silently, if the skin
+    /// lacks something, and with a message if the vertices have no joints. Joints that the tree
+    /// does not hold yet get nodes that the walk fills.
+    base::ref<GLTF::Skin> convertSkin(const scene::ISkin& skin, const GLTF::Mesh& gltfMesh);
+    /// A new light as it is at the scene's time; null for a black one.
+    base::ref<GLTF::MaterialCommon::Light> convertLight(const scene::ILight& light);
     /// A new mesh with one primitive of single lines; null if there are none. `hasAssignment` is
     /// for the edges of a mesh: they stand off its surface and are drawn in one colour.
     base::ref<GLTF::Mesh> convertLines(scene::ILines& lines, base::u32 materialIndex,
@@ -64,30 +71,61 @@ public:
                         base::u32 index, const scene::IMesh* mesh);
     /// A new material; null, silently, for all but exactly a `principalMaterial`.
     base::ref<GLTF::Material> buildMaterial(base::IPlugin& object, const scene::IMesh* mesh);
-    /// The nodes of joints that the tree holds.
-    base::hash_map<const scene::INode*, GLTF::Node*> nodeMap;
+
+    // Take a sample at `time`, which is the scene's, if it lies in the range of the entry.
+    void sampleNodeAnimation(NodeAnimation& entry, base::TimeCode time);
+    void sampleMorphAnimation(MorphAnimation& entry, base::TimeCode time);
+
+    struct Joint {
+        base::ref<GLTF::Node> node; ///< null until the walk or a skin comes to the joint
+        bool isPlaced = false;      ///< the walk has been there
+    };
+    /// The joints of all skins of the scene, and what else the walk met that is one.
+    base::hash_map<const scene::INode*, Joint> nodeMap;
     // What each geometry became: shared ones are converted once. Null for what failed.
     base::hash_map<const scene::IMesh*, GLTF::Mesh*> meshMap;
     base::hash_map<const scene::ILines*, GLTF::Mesh*> linesMap;
     /// Null for what has no counterpart.
     base::hash_map<const base::IPlugin*, base::ref<GLTF::Material>> materialMap;
     TextureExport textures{*this};
+    base::vector<NodeAnimation> nodeAnimations;
+    base::vector<MorphAnimation> morphAnimations;
     base::u32 linesIndex = 0; ///< number of lines converted so far
 
 private:
     void prepareObjects(base::PluginFactory& sceneObjects);
-    base::ref<GLTF::Node> convertRoot(const scene::INode& root, base::u8 upAxis);
+    void convertRoot(const scene::INode& root, base::u8 upAxis);
     GLTF::Options makeOptions(const base::string& path) const;
-    base::ref<GLTF::Asset> makeAsset(const base::ref<GLTF::Node>& gltfRoot) const;
+    base::ref<GLTF::Asset> makeAsset();
+    void bakeAnimations(GLTF::Asset& asset, base::IPlugin& scene);
     void clearTables();
 
     base::mat43 findParentFromNode(const scene::INode& node, const TreePosition* parent);
+    void warnOnce(const base::IPlugin& object, base::u32 fault, base::string_view text);
+    void logTransformFaults(const scene::INode& node, base::u32 faults);
+    Joint* findJoint(const scene::INode& node);
+    base::ref<GLTF::Node> placeNode(const scene::INode& node);
     void convertChildNode(GLTF::Node& gltfNode, base::IPlugin& child, const TreePosition& parent);
     bool mayPlace(const scene::INode& child, const TreePosition& parent);
     void convertObject(GLTF::Node& gltfNode, base::IPlugin& child, base::u32 materialIndex);
-    void convertMeshChild(GLTF::Node& gltfNode, base::IPlugin& child, base::u32 materialIndex,
-                          bool withTargets);
+    GLTF::Node* convertMeshChild(GLTF::Node& gltfNode, scene::IMesh& mesh, base::u32 materialIndex,
+                                 bool withTargets);
     void convertLinesChild(GLTF::Node& gltfNode, base::IPlugin& child, base::u32 materialIndex);
+    void convertSkinChild(GLTF::Node& gltfNode, base::IPlugin& child, base::u32 materialIndex);
+    void convertMorphChild(GLTF::Node& gltfNode, base::IPlugin& child, base::u32 materialIndex);
+    void convertLightChild(GLTF::Node& gltfNode, base::IPlugin& child);
+
+    void gatherJoints(const base::IPlugin& skin);
+    void addJoints(GLTF::Skin& gltfSkin, const base::vector<scene::Object>& joints,
+                   const scene::ISkin& skin);
+    void reportMissingJoints();
+
+    base::vector<base::u32> addTargets(GLTF::Mesh& gltfMesh, const scene::IMorph& morph,
+                                       const scene::IMesh& baseMesh);
+    void makeMorphAnimation(const scene::IMorph& morph, GLTF::Node& holder,
+                            const base::vector<base::u32>& targets);
+    void makeNodeAnimation(const TreePosition& position, GLTF::Node& gltfNode,
+                           const base::vector<base::TimeCode>& times);
 
     bool convertPrimitives(GLTF::Mesh& gltfMesh, scene::IMesh& mesh, base::u32 materialIndex,
                            MeshIndices& indices);
@@ -99,8 +137,13 @@ private:
     /// The nodes with child nodes that the walk has met; true while it is below them.
     base::hash_map<const scene::INode*, bool> walkedNodes_;
     base::u32 nodeCount_ = 0; ///< nodes placed in the tree
-    /// What was logged of the transforms of nodes, each of which may be met at several places.
-    base::hash_map<const scene::INode*, base::u32> transformFaults_;
+    base::ref<GLTF::Node> gltfRoot_;
+    /// The joints that skins came to before the walk, in that order.
+    base::vector<const scene::INode*> expectedJoints_;
+    /// The places of the targets that the document has of each morph.
+    base::hash_map<const scene::IMorph*, base::vector<base::u32>> morphTargets_;
+    /// What was logged of objects, each of which may be met at several places and times.
+    base::hash_map<const base::IPlugin*, base::u32> faults_;
     base::ref<GLTF::MaterialPBR> edgeMaterial_;
 };
 

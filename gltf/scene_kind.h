@@ -1,7 +1,7 @@
 #pragma once
 
-#include "b_factory.h"
 #include "b_log.h"
+#include "scene.h"
 
 namespace gltf {
 
@@ -16,6 +16,15 @@ T* findClass(base::IPlugin& object) {
                         "is left out!",
                         object.getName(), object.typeName());
     return found;
+}
+
+/// The mesh that an attribute refers to; null for all else.
+inline scene::IMesh* findMesh(const base::AttribMap& map,
+                              const scene::SchemaAttribute<scene::Object>& name) {
+    base::IPlugin* object = findObject(map, name);
+    return object && object->typeName() == scene::mesh_schema::n_kind
+               ? findClass<scene::IMesh>(*object)
+               : nullptr;
 }
 
 } // namespace gltf

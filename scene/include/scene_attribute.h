@@ -147,8 +147,10 @@ base::quatd widened(const base::base_quat<T>& q) {
     return {q.x, q.y, q.z, q.w};
 }
 
-/// Sets `components` to those of the attribute `name` if it is a float or double value with as
-/// many (four: a vector or a quaternion). False if it has another type, which is not logged.
+/// Sets `components` to those of `attribute` if it is a float or double value with as many (four:
+/// a vector or a quaternion). False if it has another type, which is not logged.
+bool loadReal(const base::Attribute& attribute, std::span<double> components);
+/// The same for the attribute `name`; true, with nothing set, if there is none.
 bool loadReal(const base::AttribMap& map, base::name_id name, std::span<double> components);
 
 template <class Attribute, class T>

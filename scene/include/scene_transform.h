@@ -1,6 +1,7 @@
 #pragma once
 
 #include "b_attribute_map.h"
+#include "scene_schema_document.h"
 
 /// Transforms of nodes. A `base::mat43` acts on column vectors: its rows are those of the linear
 /// part, its translation is added after it.
@@ -31,6 +32,29 @@ bool invert(const base::mat43& matrix, base::mat43& inverse);
 /// counts as its default, a result beyond the range as the identity. `repaired` is set to true
 /// then and left alone otherwise.
 base::mat43 composeTransform(const base::AttribMap& node, bool& repaired);
+
+/// The values of a node's attributes that its transform is composed of.
+struct TransformValues {
+    base::u8 transformation = node_schema::n_transformation.defaultValue;
+    base::u8 rotateMode = node_schema::n_rotateMode.defaultValue;
+    base::u8 rotateOrder = node_schema::n_rotateOrder.defaultValue;
+    base::vec3d translate = node_schema::n_translate.defaultValue;
+    base::quatd rotate = widened(node_schema::n_rotate.defaultValue);
+    base::vec3d rotateEuler = widened(node_schema::n_rotateEuler.defaultValue);
+    base::vec4d rotateAxisAngle = widened(node_schema::n_rotateAxisAngle.defaultValue);
+    base::vec3d scale = widened(node_schema::n_scale.defaultValue);
+    base::vec3d shear = widened(node_schema::n_shear.defaultValue);
+    base::vec3d rotatePivot, scalePivot;
+    base::vec3d targetPosition = node_schema::n_targetPosition.defaultValue;
+    base::vec3d rotationAxes = widened(node_schema::n_rotationAxes.defaultValue);
+    double distance = node_schema::n_distance.defaultValue;
+    double azimuth = node_schema::n_azimuth.defaultValue;
+    double altitude = node_schema::n_altitude.defaultValue;
+};
+// The two steps of `composeTransform`, for who composes the same node many times. Only values
+// that matter are read.
+TransformValues readTransform(const base::AttribMap& node, bool& repaired);
+base::mat43 composeTransform(const TransformValues& values, bool& repaired);
 
 /// What a matrix without shear is made of.
 struct TransformParts {

@@ -26,21 +26,23 @@ using Scalar = T;
 
 } // namespace
 
-bool loadReal(const base::AttribMap& map, base::name_id name, std::span<double> components) {
-    const base::Attribute* attribute = map.findAttribute(name);
-    if (!attribute)
-        return true;
+bool loadReal(const base::Attribute& attribute, std::span<double> components) {
     switch (components.size()) {
     case 1:
-        return loadComposite<Scalar>(*attribute, components);
+        return loadComposite<Scalar>(attribute, components);
     case 3:
-        return loadComposite<base::base_vec3>(*attribute, components);
+        return loadComposite<base::base_vec3>(attribute, components);
     case 4:
-        return loadComposite<base::base_quat>(*attribute, components) ||
-               loadComposite<base::base_vec4>(*attribute, components);
+        return loadComposite<base::base_quat>(attribute, components) ||
+               loadComposite<base::base_vec4>(attribute, components);
     default:
         return false;
     }
+}
+
+bool loadReal(const base::AttribMap& map, base::name_id name, std::span<double> components) {
+    const base::Attribute* attribute = map.findAttribute(name);
+    return !attribute || loadReal(*attribute, components);
 }
 
 } // namespace scene

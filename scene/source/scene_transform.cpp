@@ -105,41 +105,58 @@ Matrix axisRotation(const vec3d& axis, double degrees) {
             {a.z * a.x * d - a.y * s, a.z * a.y * d + a.x * s, c + a.z * a.z * d}};
 }
 
+bool isFinite(double v) {
+    return std::isfinite(v);
+}
+template <class T>
+bool isFinite(const T& v) {
+    if constexpr (requires { v.w; }) {
+        if (!std::isfinite(v.w))
+            return false;
+    }
+    return std::isfinite(v.x) && std::isfinite(v.y) && std::isfinite(v.z);
+}
+
 /// Reads a node's attributes; those with a number that is not finite count as their default.
 class NodeReader {
 public:
-    NodeReader(const base::AttribMap& node, bool& repaired) : node_(node), repaired_(repaired) {}
+    NodeReader(const base::AttribMap& node, bool& repaired)
+        : node_(node), entries_(node.entries()), mayInherit_(node.parent() != nullptr),
+          repaired_(repaired) {}
 
-    template <class T>
-    auto real(const DefaultedAttribute<T>& attribute) {
-        return checked(readReal(node_, attribute), scene::widened(attribute.defaultValue));
+    /// Sets `value`, which is the default, to that of the attribute.
+    template <class Attribute, class T>
+    void read(const Attribute& attribute, T& value) {
+        const base::Attribute* own = findOwn(attribute);
+        if (!own && !mayInherit_)
+            return;
+        T found = value;
+        const std::span components(reinterpret_cast<double*>(&found),
+                                   sizeof found / sizeof(double));
+        if (!own || !loadReal(*own, components))
+            found = readReal(node_, attribute);
+        if (isFinite(found))
+            value = found;
+        else
+            repaired_ = true;
     }
-    vec3d real(const SchemaAttribute<vec3d>& attribute) {
-        return checked(readReal(node_, attribute), vec3d{});
-    }
-    base::u8 code(const DefaultedAttribute<Enumeration>& attribute) {
-        return read(node_, attribute);
+    void read(const DefaultedAttribute<Enumeration>& attribute, base::u8& value) {
+        if (findOwn(attribute) || mayInherit_)
+            value = scene::read(node_, attribute);
     }
 
 private:
-    static bool isFinite(double v) { return std::isfinite(v); }
-    template <class T>
-    static bool isFinite(const T& v) {
-        if constexpr (requires { v.w; }) {
-            if (!std::isfinite(v.w))
-                return false;
-        }
-        return std::isfinite(v.x) && std::isfinite(v.y) && std::isfinite(v.z);
-    }
-    template <class T>
-    T checked(const T& value, const T& defaultValue) {
-        if (isFinite(value))
-            return value;
-        repaired_ = true;
-        return defaultValue;
+    /// Nodes have few attributes, so a walk beats the general look-up. A link is found as such.
+    const base::Attribute* findOwn(base::name_id name) const {
+        for (const auto& [key, attribute] : entries_)
+            if (key == name)
+                return attribute;
+        return nullptr;
     }
 
     const base::AttribMap& node_;
+    const base::vector<base::AttribMap::Entry>& entries_;
+    bool mayInherit_;
     bool& repaired_;
 };
 
@@ -147,17 +164,16 @@ Matrix scaling(const vec3d& s) {
     return {{s.x, 0, 0}, {0, s.y, 0}, {0, 0, s.z}};
 }
 
-Matrix readRotation(NodeReader& node) {
-    switch (node.code(node_schema::n_rotateMode)) {
+Matrix rotationOf(const TransformValues& v) {
+    switch (v.rotateMode) {
     case 0:
-        return eulerRotation(node.real(node_schema::n_rotateEuler),
-                             node.code(node_schema::n_rotateOrder));
+        return eulerRotation(v.rotateEuler, v.rotateOrder);
     case 1: {
-        const base::vec4d turn = node.real(node_schema::n_rotateAxisAngle);
+        const base::vec4d& turn = v.rotateAxisAngle;
         return axisRotation({turn.x, turn.y, turn.z}, turn.w);
     }
     default:
-        return quaternionRotation(node.real(node_schema::n_rotate));
+        return quaternionRotation(v.rotate);
     }
 }
 
@@ -166,38 +182,75 @@ struct Affine {
     vec3d translation;
 };
 
-Affine composePlaced(NodeReader& node) {
-    const Matrix rotation = readRotation(node);
-    const vec3d shear = node.real(node_schema::n_shear);
-    const Matrix deformation = Matrix{{1, shear.x, shear.y}, {0, 1, shear.z}, {0, 0, 1}} *
-                               scaling(node.real(node_schema::n_scale));
-    const vec3d rotatePivot = node.real(node_schema::n_rotatePivot);
-    const vec3d scalePivot = node.real(node_schema::n_scalePivot);
-    const vec3d turned = rotation * (scalePivot - rotatePivot - deformation * scalePivot);
-    return {rotation * deformation, node.real(node_schema::n_translate) + rotatePivot + turned};
+Affine composePlaced(const TransformValues& v) {
+    const Matrix rotation = rotationOf(v);
+    const Matrix deformation =
+        Matrix{{1, v.shear.x, v.shear.y}, {0, 1, v.shear.z}, {0, 0, 1}} * scaling(v.scale);
+    const vec3d turned = rotation * (v.scalePivot - v.rotatePivot - deformation * v.scalePivot);
+    return {rotation * deformation, v.translate + v.rotatePivot + turned};
 }
 
-Affine composeAimed(NodeReader& node) {
-    const double azimuth = node.real(node_schema::n_azimuth);
-    const double altitude = node.real(node_schema::n_altitude);
-    const double distance = node.real(node_schema::n_distance);
-    const Matrix aim = rotationY(azimuth) * rotationX(-altitude);
-    const Matrix own = eulerRotation(node.real(node_schema::n_rotationAxes), 0) *
-                       scaling(node.real(node_schema::n_scale));
-    return {aim * own, node.real(node_schema::n_targetPosition) + aim * vec3d{0, 0, distance}};
+Affine composeAimed(const TransformValues& v) {
+    const Matrix aim = rotationY(v.azimuth) * rotationX(-v.altitude);
+    const Matrix own = eulerRotation(v.rotationAxes, 0) * scaling(v.scale);
+    return {aim * own, v.targetPosition + aim * vec3d{0, 0, v.distance}};
+}
+
+/// A node aimed at a point.
+bool isAimed(const TransformValues& values) {
+    return values.transformation == 1;
+}
+
+void readRotation(NodeReader& node, TransformValues& values) {
+    node.read(node_schema::n_rotateMode, values.rotateMode);
+    switch (values.rotateMode) {
+    case 0:
+        node.read(node_schema::n_rotateEuler, values.rotateEuler);
+        node.read(node_schema::n_rotateOrder, values.rotateOrder);
+        break;
+    case 1:
+        node.read(node_schema::n_rotateAxisAngle, values.rotateAxisAngle);
+        break;
+    default:
+        node.read(node_schema::n_rotate, values.rotate);
+        break;
+    }
 }
 
 } // namespace
 
-mat43 composeTransform(const base::AttribMap& node, bool& repaired) {
-    NodeReader reader(node, repaired);
-    const bool aimed = reader.code(node_schema::n_transformation) == 1;
-    const Affine result = aimed ? composeAimed(reader) : composePlaced(reader);
+TransformValues readTransform(const base::AttribMap& map, bool& repaired) {
+    NodeReader node(map, repaired);
+    TransformValues values;
+    node.read(node_schema::n_transformation, values.transformation);
+    if (isAimed(values)) {
+        node.read(node_schema::n_azimuth, values.azimuth);
+        node.read(node_schema::n_altitude, values.altitude);
+        node.read(node_schema::n_distance, values.distance);
+        node.read(node_schema::n_rotationAxes, values.rotationAxes);
+        node.read(node_schema::n_targetPosition, values.targetPosition);
+    } else {
+        readRotation(node, values);
+        node.read(node_schema::n_shear, values.shear);
+        node.read(node_schema::n_rotatePivot, values.rotatePivot);
+        node.read(node_schema::n_scalePivot, values.scalePivot);
+        node.read(node_schema::n_translate, values.translate);
+    }
+    node.read(node_schema::n_scale, values.scale);
+    return values;
+}
+
+mat43 composeTransform(const TransformValues& values, bool& repaired) {
+    const Affine result = isAimed(values) ? composeAimed(values) : composePlaced(values);
     if (!fitsFloat(result.linear) || !fitsFloat(result.translation)) {
         repaired = true;
         return {};
     }
     return {narrowed(result.linear), result.translation};
+}
+
+mat43 composeTransform(const base::AttribMap& node, bool& repaired) {
+    return composeTransform(readTransform(node, repaired), repaired);
 }
 
 } // namespace scene

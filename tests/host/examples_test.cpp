@@ -1,7 +1,7 @@
 // The examples that the README shows do what it says of them.
 #include "program.h"
 
-#include "support/gltf_reader.h"
+#include "support/gltf_pose.h"
 
 #include <map>
 
@@ -34,7 +34,27 @@ TEST_F(ExamplesTest, LighthouseHasMaterialsAndPictures) {
         ++images[image["mimeType"].GetString()];
     // Only the signboard has alpha.
     EXPECT_EQ(images, (std::map<std::string, int>{{"image/jpeg", 4}, {"image/png", 1}}));
-    EXPECT_EQ(file.count("materials"), 7u);
+    EXPECT_EQ(file.count("materials"), 8u);
+}
+
+TEST_F(ExamplesTest, LighthouseMoves) {
+    const std::string model = SOURCE_FOLDER "/examples/lighthouse.dae";
+    EXPECT_EQ(runReal({model, "@/a.glb", "-exportCompress", "false"}).err, "");
+    const auto file = test_support::GltfFile::read(path("@/a.glb"));
+    EXPECT_EQ(file.count("skins"), 1u);
+    // The beams go round once in 8 seconds: a quarter turn in 2 moves +X to -Z.
+    for (const test_support::NodeInstance& node : file.instances()) {
+        const auto& object = file.element("nodes", node.node);
+        if (!object.HasMember("name") || object["name"].GetString() != std::string("Beam_1"))
+            continue;
+        // The first column is where the X axis points.
+        const auto start = test_support::GltfPose(file, 0).worldFromNode(node.node);
+        const auto turned = test_support::GltfPose(file, 2).worldFromNode(node.node);
+        EXPECT_NEAR(turned[0], start[2], 1e-5);
+        EXPECT_NEAR(turned[2], -start[0], 1e-5);
+        return;
+    }
+    FAIL() << "there is no beam";
 }
 
 TEST_F(ExamplesTest, LighthouseIsWhatItsScriptWrites) {

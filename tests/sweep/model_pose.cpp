@@ -117,36 +117,37 @@ private:
     ModelPose pose_;
 };
 
-/// The weights of the morph targets. FBX names a channel by node and number of the mesh.
+/// The weights of the morph targets. FBX names its keys by node and place of the mesh, and numbers
+/// the channels of the file: a channel with shapes in between has a target of its name for each, of
+/// which the last is the whole shape.
 std::vector<double> Poser::weightsOf(const aiNode& node, const aiMesh& mesh,
                                      unsigned meshIndex) const {
     std::vector<double> weights;
+    std::vector<unsigned> targetOfChannel;
     for (unsigned t = 0; t < mesh.mNumAnimMeshes; ++t) {
-        weights.push_back(mesh.mAnimMeshes[t]->mWeight);
+        const aiAnimMesh& target = *mesh.mAnimMeshes[t];
+        if (t > 0 && target.mName.length > 0 && target.mName == mesh.mAnimMeshes[t - 1]->mName) {
+            weights[t - 1] = 0;
+            targetOfChannel.back() = t;
+        } else {
+            targetOfChannel.push_back(t);
+        }
+        weights.push_back(target.mWeight);
     }
     const std::string name = node.mName.C_Str();
-    unsigned place = 0;
-    while (place < node.mNumMeshes && node.mMeshes[place] != meshIndex) {
-        ++place;
-    }
+    const auto place = std::find(node.mMeshes, node.mMeshes + node.mNumMeshes, meshIndex);
+    const std::string numbered = name + "*" + std::to_string(place - node.mMeshes);
     for (unsigned i = 0; animation_ && i < animation_->mNumMorphMeshChannels; ++i) {
         const aiMeshMorphAnim& channel = *animation_->mMorphMeshChannels[i];
         const std::string target = channel.mName.C_Str();
-        if (target != name && target != name + "*" + std::to_string(place)) {
+        if (target != name && target != numbered) {
             continue;
         }
         const Between at = find(channel.mKeys, channel.mNumKeys, time_);
-        for (const auto& [key, factor] : {std::pair(at.a, 1 - at.u), std::pair(at.b, at.u)}) {
-            const aiMeshMorphKey& values = channel.mKeys[key];
-            for (unsigned k = 0; key == at.a && k < values.mNumValuesAndWeights; ++k) {
-                weights.at(values.mValues[k]) = 0;
-            }
-            for (unsigned k = 0; k < values.mNumValuesAndWeights; ++k) {
-                weights.at(values.mValues[k]) += factor * values.mWeights[k];
-            }
-            if (at.a == at.b) {
-                break;
-            }
+        const aiMeshMorphKey &a = channel.mKeys[at.a], &b = channel.mKeys[at.b];
+        for (unsigned k = 0; k < a.mNumValuesAndWeights; ++k) {
+            weights.at(targetOfChannel.at(a.mValues[k])) =
+                a.mWeights[k] + at.u * (b.mWeights[k] - a.mWeights[k]);
         }
     }
     return weights;
@@ -159,7 +160,8 @@ std::vector<Vector> Poser::morphed(const aiNode& node, const aiMesh& mesh,
     for (unsigned v = 0; v < mesh.mNumVertices; ++v) {
         const aiVector3D& base = mesh.mVertices[v];
         Vector position{base.x, base.y, base.z};
-        for (unsigned t = 0; t < mesh.mNumAnimMeshes; ++t) {
+        // A mesh with a skeleton is exported without its targets.
+        for (unsigned t = 0; mesh.mNumBones == 0 && t < mesh.mNumAnimMeshes; ++t) {
             if (!mesh.mAnimMeshes[t]->mVertices) {
                 continue;
             }

@@ -1,0 +1,24 @@
+#pragma once
+
+#include "assimp/import_animation.h"
+#include "assimp/key_reading.h"
+
+struct aiAnimation;
+
+namespace assimp {
+
+/// The keys of one animation of a file, by what they move.
+struct ClipTracks {
+    base::string name;
+    base::TimeCode first{0}, last{0}; ///< the range of the clip on its own clock
+    base::hash_map<const aiNode*, NodeMotion> motions;
+    /// By number of the mesh and of the target.
+    base::map<std::pair<base::u32, base::u32>, KeyTrack<float>> weights;
+
+    bool isEmpty() const { return motions.empty() && weights.empty(); }
+};
+
+ClipTracks readClip(const aiAnimation& animation, const AnimationClock& clock, NodeTable& nodes,
+                    const base::vector<MorphedMesh>& morphs, AnimationFaults& faults);
+
+} // namespace assimp
