@@ -23,6 +23,8 @@ using Type = GLTF::Accessor::Type;
 namespace {
 
 constexpr u32 maximumFrames = 1'000'000;
+/// Bytes of all samples: half of what a document's one buffer holds, which has other data too.
+constexpr base::u64 maximumBytes = 1u << 30;
 
 struct TimeRange {
     TimeCode start{std::numeric_limits<i64>::max()};
@@ -38,6 +40,11 @@ struct TimeRange {
     auto operator<=>(const TimeRange&) const = default;
 };
 
+/// From `from` to a time that is not before it; more than a signed number holds perhaps.
+base::u64 ticksBetween(TimeCode from, TimeCode to) {
+    return static_cast<base::u64>(to.ticks) - static_cast<base::u64>(from.ticks);
+}
+
 /// The times at which everything is sampled.
 struct SampleGrid {
     TimeCode start;
@@ -45,13 +52,17 @@ struct SampleGrid {
     u32 count;
 
     TimeCode at(u32 index) const { return {start.ticks + index * step}; }
+    /// The time in the document.
+    float secondsAt(u32 index) const { return static_cast<float>(at(index).seconds()); }
+    /// False for a time that the document can't tell from the one before it.
+    bool isDistinct(u32 index) const {
+        return index == 0 || secondsAt(index) > secondsAt(index - 1);
+    }
     /// The first index whose time is `time` or later, `count` if there is none.
     u32 firstFrom(TimeCode time) const {
         if (time <= start)
             return 0;
-        // The distance may exceed a signed number.
-        const auto distance =
-            static_cast<base::u64>(time.ticks) - static_cast<base::u64>(start.ticks);
+        const base::u64 distance = ticksBetween(start, time);
         const auto ticks = static_cast<base::u64>(step);
         const base::u64 index = distance / ticks + (distance % ticks != 0);
         return static_cast<u32>(std::min<base::u64>(index, count));
@@ -74,21 +85,58 @@ u32 readFrameRate(const IPlugin& scene) {
     return standard;
 }
 
+base::u64 sampleBytes(const NodeAnimation& entry) {
+    const auto bytes = [&](Channel::Path path, std::size_t size) {
+        return (entry.paths & 1u << path) != 0 ? size : 0;
+    };
+    return bytes(Channel::translation, sizeof(base::vec3f)) +
+           bytes(Channel::scale, sizeof(base::vec3f)) +
+           bytes(Channel::rotation, sizeof(base::quatf));
+}
+base::u64 sampleBytes(const MorphAnimation& entry) {
+    return entry.targets.size() * sizeof(float);
+}
+
+/// Bytes of the samples of all entries on `grid`.
+template <class Entries>
+base::u64 byteCount(const SampleGrid& grid, const Entries& entries) {
+    base::u64 bytes = 0;
+    for (const auto& entry : entries)
+        bytes += sampleBytes(entry) * grid.countWithin({entry.start, entry.end});
+    return bytes;
+}
+
+/// The greatest count up to that of `grid` with which `fits` holds, which all lesser ones do too.
+template <class Fits>
+u32 greatestCount(SampleGrid grid, const Fits& fits) {
+    u32 low = 0, high = grid.count;
+    while (low < high) {
+        grid.count = low + (high - low + 1) / 2;
+        if (fits(grid))
+            low = grid.count;
+        else
+            high = grid.count - 1;
+    }
+    return low;
+}
+
 /// The grid of whole frames that begins with the range; its last one lies before the end.
 SampleGrid makeGrid(const TimeRange& range, const IPlugin& scene) {
     // Whole numbers of frames come out a little too small for some ranges.
     constexpr double tolerance = 1e-6;
     const double rate = readFrameRate(scene);
     const double frames = (range.end.seconds() - range.start.seconds()) * rate + tolerance;
-    auto count = base::saturate<u32>(frames);
-    if (count > maximumFrames) {
-        base::log().log(base::logScene, base::logError,
-                        "gltf |{}| The animation has {} frames, only the first {} are exported!",
-                        scene.getName(), count, maximumFrames);
-        count = maximumFrames;
-    }
-    const double ticks = static_cast<double>(TimeCode::ticksPerSecond) / rate;
-    return {range.start, base::saturate<i64>(ticks), count};
+    const auto step = base::saturate<i64>(static_cast<double>(TimeCode::ticksPerSecond) / rate);
+    // At the ends of time the seconds are coarser than the frames.
+    const base::u64 most = ticksBetween(range.start, range.end) / static_cast<base::u64>(step) + 1;
+    return {range.start, step,
+            static_cast<u32>(std::min<base::u64>(base::saturate<u32>(frames), most))};
+}
+
+void logCut(const IPlugin& scene, u32 wanted, u32 exported) {
+    base::log().log(base::logScene, base::logError,
+                    "gltf |{}| The animation has {} frames, only the first {} are exported!",
+                    scene.getName(), wanted, exported);
 }
 
 /// An accessor with a copy of `samples`, which are released; null if there are none. Weights are
@@ -159,7 +207,8 @@ private:
         vector<float> seconds;
         const u32 end = grid_.endOf(range);
         for (u32 i = grid_.firstFrom(range.start); i < end; ++i)
-            seconds.push_back(static_cast<float>(grid_.at(i).seconds()));
+            if (grid_.isDistinct(i))
+                seconds.push_back(grid_.secondsAt(i));
         return times = takeSamples(Type::scalar, seconds);
     }
 
@@ -178,7 +227,19 @@ void GLTFScenePlugin::bakeAnimations(GLTF::Asset& asset, IPlugin& scene) {
     range.include(morphAnimations);
     if (range.start >= range.end)
         return;
-    const SampleGrid grid = makeGrid(range, scene);
+    SampleGrid grid = makeGrid(range, scene);
+    const u32 wanted = grid.count;
+    grid.count = std::min(wanted, maximumFrames);
+    grid.count = greatestCount(grid, [&](const SampleGrid& cut) {
+        return byteCount(cut, nodeAnimations) + byteCount(cut, morphAnimations) <= maximumBytes;
+    });
+    if (grid.count != wanted)
+        logCut(scene, wanted, grid.count);
+    if (grid.count > 1 && !grid.isDistinct(grid.count - 1))
+        base::log().log(base::logScene, base::logWarning,
+                        "gltf |{}| The animation is so late that frames have the same time, those "
+                        "are left out!",
+                        scene.getName());
     for (NodeAnimation& entry : nodeAnimations)
         reserveSamples(entry, grid.countWithin({entry.start, entry.end}));
     for (MorphAnimation& entry : morphAnimations)
@@ -186,6 +247,8 @@ void GLTFScenePlugin::bakeAnimations(GLTF::Asset& asset, IPlugin& scene) {
     {
         SceneClock clock(scene);
         for (u32 i = 0; i < grid.count; ++i) {
+            if (!grid.isDistinct(i))
+                continue;
             const TimeCode time = grid.at(i);
             clock.set(time);
             for (NodeAnimation& entry : nodeAnimations)

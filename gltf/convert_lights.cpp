@@ -41,17 +41,23 @@ LightSource readLight(const scene::ILight& light, bool& isRepaired) {
         isRepaired = true;
         return attribute.defaultValue;
     };
-    const vec3f color = read(light, light_schema::n_color);
-    const float intensity = read(light, light_schema::n_intensity);
+    const auto isColor = [&](const vec3f& color) {
+        const bool isFinite =
+            std::isfinite(color.x) && std::isfinite(color.y) && std::isfinite(color.z);
+        isRepaired |= !isFinite;
+        return isFinite;
+    };
+    vec3f color = read(light, light_schema::n_color);
+    if (!isColor(color))
+        color = light_schema::n_color.defaultValue;
+    const float intensity = readFinite(light_schema::n_intensity);
     LightSource source{read(light, light_schema::n_lightType),
                        {color.x * intensity, color.y * intensity, color.z * intensity},
                        readFinite(light_schema::n_size),
                        readFinite(light_schema::n_spotConeAngle)};
-    if (!std::isfinite(source.color.x) || !std::isfinite(source.color.y) ||
-        !std::isfinite(source.color.z)) {
-        isRepaired = true;
+    // Each may be finite, but not their product.
+    if (!isColor(source.color))
         source.color = light_schema::n_color.defaultValue;
-    }
     return source;
 }
 

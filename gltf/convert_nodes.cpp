@@ -3,10 +3,11 @@
 #include "gltf/node_transform.h"
 #include "gltf/scene_kind.h"
 
+#include "scene_animation.h"
 #include "scene_schema.h"
 #include "scene_transform.h"
 
-#include <cmath>
+#include <algorithm>
 
 namespace gltf {
 
@@ -18,7 +19,6 @@ using base::string;
 using base::string_view;
 using base::u32;
 using base::u8;
-using base::vec3f;
 
 namespace {
 
@@ -39,6 +39,14 @@ mat43 worldFromNode(const TreePosition& position) {
     for (const TreePosition* above = position.parent; above; above = above->parent)
         world = scene::multiply(above->parentFromNode, world);
     return world;
+}
+
+/// True if all parts of the transform of `node` are sampled, so that it can undo what moves.
+bool isWhollyAnimated(const scene::INode& node) {
+    using Schema = scene::node_schema;
+    const name_id parts[] = {Schema::n_translate, Schema::n_scale, Schema::n_rotate};
+    return std::ranges::all_of(
+        parts, [&](name_id part) { return scene::findLayerPath(node.findAttribute(part, false)); });
 }
 
 /// True if the node at `position` or one above it is animated.
@@ -75,7 +83,7 @@ mat43 GLTFScenePlugin::findParentFromNode(const scene::INode& node, const TreePo
     if (isFree) {
         const mat43 parentWorld = worldFromNode(*parent);
         faults = node.getTransform(transform, &parentWorld);
-        if (isPlacedByAnimation(parent) && !node.hasTransformChannels())
+        if (isPlacedByAnimation(parent) && !isWhollyAnimated(node))
             faults |= animatedParent;
     } else {
         faults = node.getTransform(transform, nullptr);

@@ -26,7 +26,14 @@ using scene::skin_schema;
 namespace {
 
 /// What is logged of a skin once.
-enum SkinFault : u32 { noVertexJoints = 1, furtherSet = 2, endlessPose = 4, gapsInJoints = 8 };
+enum SkinFault : u32 {
+    noVertexJoints = 1,
+    furtherSet = 2,
+    endlessPose = 4,
+    gapsInJoints = 8,
+    unknownJoints = 16,
+    missingPoses = 32,
+};
 
 /// What a skin is made of.
 struct SkinSource {
@@ -89,9 +96,19 @@ ref<GLTF::Accessor> makeMatrices(const vector<mat43>& transforms, const scene::I
         base::makeRef<GLTF::BufferView>(0, length, std::move(buffer), GLTF::BufferView::noTarget));
 }
 
-bool hasJoints(const GLTF::Mesh& gltfMesh) {
-    return !gltfMesh.primitives.empty() &&
-           std::as_const(*gltfMesh.primitives[0]).attributes.contains("JOINTS_0");
+/// The joints of the vertices, four each; null if they have none.
+const GLTF::Accessor* findVertexJoints(const GLTF::Mesh& gltfMesh) {
+    if (gltfMesh.primitives.empty())
+        return nullptr;
+    const auto* joints = std::as_const(*gltfMesh.primitives[0]).attributes.get("JOINTS_0");
+    return joints ? joints->get() : nullptr;
+}
+
+/// True if all joints of the vertices are among the first `count`.
+bool areBelow(const GLTF::Accessor& vertexJoints, std::size_t count) {
+    const auto* joints = reinterpret_cast<const base::u16*>(vertexJoints.bufferView->buffer->data);
+    return std::all_of(joints, joints + 4 * std::size_t(vertexJoints.count),
+                       [&](base::u16 joint) { return joint < count; });
 }
 
 } // namespace
@@ -111,11 +128,21 @@ ref<GLTF::Skin> GLTFScenePlugin::convertSkin(const scene::ISkin& skin, const GLT
     SkinSource source;
     if (!findSource(skin, source))
         return nullptr;
-    if (!hasJoints(gltfMesh)) {
+    const GLTF::Accessor* vertexJoints = findVertexJoints(gltfMesh);
+    if (!vertexJoints) {
         warnOnce(skin, noVertexJoints,
                  "gltf |{}| The mesh has no joints at its vertices, it gets no skin!");
         return nullptr;
     }
+    if (!areBelow(*vertexJoints, source.joints->size())) {
+        warnOnce(skin, unknownJoints,
+                 "gltf |{}| The vertices of the mesh name joints that the skin does not have, it "
+                 "gets no skin!");
+        return nullptr;
+    }
+    if (source.transforms->size() < source.joints->size())
+        warnOnce(skin, missingPoses,
+                 "gltf |{}| The skin has fewer bind poses than joints, the document is not valid!");
     if (source.jointsSet != 0)
         warnOnce(skin, furtherSet,
                  "gltf |{}| The skin names another set of joints than the first, which alone is "

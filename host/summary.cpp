@@ -46,7 +46,7 @@ string unexportedText(const base::vector<ObjectName>& objects) {
         ++counts[object.type];
     string text;
     for (const auto& [type, count] : counts)
-        text += base::format("{}{} {}", text.empty() ? ", without " : " and ", count, type);
+        text += (text.empty() ? ", without " : ", ") + counted(count, type);
     return text;
 }
 

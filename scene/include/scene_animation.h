@@ -79,6 +79,7 @@ private:
     void rebuildAt(const OptionalTime& time);
     void updateAt(base::TimeCode time, base::name_id typeFilter, base::i32 channelIndex);
     base::AttribArray& makeOutputs();
+    bool isDriven(base::u32 index) const;
     void updateOutput(base::AttribArray& outputs, const AnimClipInfo& info,
                       const base::IPlugin* channel, base::u32 index, base::TimeCode localTime,
                       base::name_id typeFilter);

@@ -123,6 +123,9 @@ inline base::AttribArray& write(base::AttribMap& map, const SchemaAttribute<Item
     return map.arrayAttribute(attribute);
 }
 
+/// The map at `index` of a list, perhaps through a link; null for a gap and past the end.
+base::AttribMap* findItemMap(const base::AttribArray& items, base::u32 index);
+
 /// The object that a reference attribute holds, null where there is none.
 inline base::IPlugin* findObject(const base::AttribMap& map,
                                  const SchemaAttribute<Object>& attribute) {

@@ -95,7 +95,7 @@ void IAnimLayer::rebuildAt(const OptionalTime& time) {
     const base::AttribArray* actions = time ? find(*this, n_actions) : nullptr;
     const u32 count = actions ? actions->size() : 0;
     for (u32 i = 0; i < count; ++i) {
-        base::AttribMap* map = findAction(*actions, i);
+        base::AttribMap* map = findItemMap(*actions, i);
         if (!map)
             continue;
         const LayerAction action = readAction(*map);
@@ -105,15 +105,13 @@ void IAnimLayer::rebuildAt(const OptionalTime& time) {
                             "gltf |{}| Action {} of the layer has no 'playAt', it is not played!",
                             getName(), i);
         }
-        if (!action.playAt || *time < *action.playAt || !action.clip)
+        if (!action.playsAt(*time))
             continue;
         if (action.isNegative()) {
             base::log().log(base::logScene, base::logWarning,
                             "animLayer |{}| Negative animation clip duration!", getName());
             continue;
         }
-        if (action.endsBefore(*time))
-            continue;
         AnimClipInfo& info = activeClips_.emplace_back();
         info.action = i;
         info.actionMap.set(map);
@@ -226,6 +224,14 @@ void IAnimLayer::afterLoad(base::i32 version) {
     rebuildActiveClips();
 }
 
+/// True if a clip that plays has a channel for output `index`.
+bool IAnimLayer::isDriven(u32 index) const {
+    return std::ranges::any_of(activeClips_, [&](const AnimClipInfo& info) {
+        const auto* channels = channelsOf(info.channels.target());
+        return channels && index < channels->size();
+    });
+}
+
 void IAnimLayer::pathChanged(const AttribPath& path, u32 mode) {
     if (isBusy_ || path.steps().size() < 2)
         return;
@@ -236,7 +242,7 @@ void IAnimLayer::pathChanged(const AttribPath& path, u32 mode) {
             return;
         if (!areClipsBuilt_)
             rebuildActiveClips();
-        else if (activeClips_.empty())
+        else if (!isDriven(*index))
             return;
         update({}, static_cast<base::i32>(*index));
         return;

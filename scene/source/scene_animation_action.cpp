@@ -2,13 +2,6 @@
 
 namespace scene {
 
-base::AttribMap* findAction(const base::AttribArray& actions, base::u32 index) {
-    base::Attribute* item = actions.item(index);
-    if (const base::AttribLink* link = item ? item->asLink() : nullptr)
-        item = link->path().resolve();
-    return item ? item->asMap() : nullptr;
-}
-
 LayerAction readAction(const base::AttribMap& action) {
     using Action = animLayerAction_schema;
     using Clip = animClip_schema;
@@ -22,6 +15,8 @@ LayerAction readAction(const base::AttribMap& action) {
     result.clip = clip;
     const base::TimeCode* start = find(*clip, Clip::n_startTime);
     const base::TimeCode* end = find(*clip, Clip::n_endTime);
+    if (start)
+        result.start = *start;
     if (start && end)
         result.duration = scaledTicks(WideTicks(end->ticks) - start->ticks, result.playSpeed);
     return result;

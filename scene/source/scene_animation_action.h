@@ -11,16 +11,17 @@ struct LayerAction {
     std::optional<base::TimeCode> playAt; ///< absent: never
     base::IPlugin* clip = nullptr;        ///< null unless it is an animation clip
     base::i32 playSpeed = 100;            ///< percent
+    base::TimeCode start;                 ///< of the clip
     std::optional<WideTicks> duration;    ///< on the layer's timeline; absent: without end
 
     bool isNegative() const { return duration && *duration < 0; }
-    bool endsBefore(base::TimeCode time) const {
-        return duration && WideTicks(playAt->ticks) + *duration < time.ticks;
+    /// True if the clip is heard at `time` of the layer, unless its duration is negative.
+    bool playsAt(base::TimeCode time) const {
+        return clip && playAt && *playAt <= time &&
+               !(duration && !isNegative() && WideTicks(playAt->ticks) + *duration < time.ticks);
     }
 };
 
-/// The map of an action; null for a gap.
-base::AttribMap* findAction(const base::AttribArray& actions, base::u32 index);
 LayerAction readAction(const base::AttribMap& action);
 
 /// The references in a clip's `keyframeChannels`; null if there are none.

@@ -21,15 +21,9 @@ base::IPlugin* findChannel(const base::Attribute* keyframeChannels, u32 index) {
     return channels && index < channels->size() ? (*channels)[index].get() : nullptr;
 }
 
-TimeCode startTimeOf(const base::IPlugin& clip) {
-    const TimeCode* start = find(clip, animClip_schema::n_startTime);
-    return start ? *start : TimeCode();
-}
-
 /// The key times of the only curve of `channel`, null if it has none.
 const KeyTimes* findKeyTimes(const base::IPlugin& channel) {
-    const base::AttribArray* curves = find(channel, keyframeChannel_schema::n_curves);
-    const base::AttribMap* curve = curves && curves->size() == 1 ? findCurve(*curves, 0) : nullptr;
+    const base::AttribMap* curve = findOnlyCurve(channel);
     return curve ? find(*curve, keyframeChannelCurve_schema::n_times) : nullptr;
 }
 
@@ -45,7 +39,7 @@ void normalize(vector<TimeCode>& times) {
 void IAnimLayer::collectKeyTimes(u32 index, vector<TimeCode>& times) const {
     const base::AttribArray* actions = find(*this, n_actions);
     for (u32 i = 0; actions && i < actions->size(); ++i) {
-        const base::AttribMap* map = findAction(*actions, i);
+        const base::AttribMap* map = findItemMap(*actions, i);
         const LayerAction action = map ? readAction(*map) : LayerAction();
         if (!action.playAt || !action.clip || action.playSpeed == 0 || action.isNegative())
             continue;
@@ -54,9 +48,8 @@ void IAnimLayer::collectKeyTimes(u32 index, vector<TimeCode>& times) const {
         const KeyTimes* keys = channel ? findKeyTimes(*channel) : nullptr;
         if (!keys)
             continue;
-        const TimeCode start = startTimeOf(*action.clip);
         for (const TimeCode key : *keys)
-            times.push_back(layerTime(key, *action.playAt, action.playSpeed, start));
+            times.push_back(layerTime(key, *action.playAt, action.playSpeed, action.start));
     }
 }
 
@@ -66,17 +59,15 @@ bool IAnimLayer::setKey(u32 index, TimeCode time, const T& value) {
     IKeyframeChannel* channel = nullptr;
     TimeCode channelTime;
     for (u32 i = 0; actions && i < actions->size(); ++i) {
-        const base::AttribMap* map = findAction(*actions, i);
+        const base::AttribMap* map = findItemMap(*actions, i);
         const LayerAction action = map ? readAction(*map) : LayerAction();
-        if (!action.clip || !action.playAt || time < *action.playAt || action.isNegative() ||
-            action.endsBefore(time))
+        if (!action.playsAt(time) || action.isNegative())
             continue;
         base::IPlugin* found =
             findChannel(action.clip->findAttribute(animClip_schema::n_keyframeChannels), index);
         if (auto* keyed = dynamic_cast<IKeyframeChannel*>(found)) {
             channel = keyed;
-            channelTime =
-                clipTime(time, *action.playAt, action.playSpeed, startTimeOf(*action.clip));
+            channelTime = clipTime(time, *action.playAt, action.playSpeed, action.start);
         }
     }
     if (!channel) {

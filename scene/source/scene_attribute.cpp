@@ -26,6 +26,13 @@ using Scalar = T;
 
 } // namespace
 
+base::AttribMap* findItemMap(const base::AttribArray& items, base::u32 index) {
+    base::Attribute* item = items.item(index);
+    if (const base::AttribLink* link = item ? item->asLink() : nullptr)
+        item = link->path().resolve();
+    return item ? item->asMap() : nullptr;
+}
+
 bool loadReal(const base::Attribute& attribute, std::span<double> components) {
     switch (components.size()) {
     case 1:

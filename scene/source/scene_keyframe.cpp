@@ -5,6 +5,8 @@
 #include "b_exception.h"
 #include "b_log.h"
 
+#include <optional>
+
 namespace scene {
 
 namespace {
@@ -224,8 +226,7 @@ T computeValue(const IKeyframeChannel& channel, TimeCode time) {
 }
 
 base::name_id findValueType(const IKeyframeChannel& channel) {
-    const base::AttribArray* curves = find(channel, keyframeChannel_schema::n_curves);
-    const base::AttribMap* curve = curves && curves->size() == 1 ? findCurve(*curves, 0) : nullptr;
+    const base::AttribMap* curve = findOnlyCurve(channel);
     const base::Attribute* values =
         curve ? curve->findAttribute(keyframeChannelCurve_schema::n_values) : nullptr;
     base::name_id name;

@@ -67,11 +67,9 @@ void logCurve(int level, base::string_view text, const base::IPlugin& channel) {
     base::log().log(base::logScene, level, text, channel.getName());
 }
 
-AttribMap* findCurve(const base::AttribArray& curves, base::u32 index) {
-    Attribute* item = curves.item(index);
-    if (const base::AttribLink* link = item ? item->asLink() : nullptr)
-        item = link->path().resolve();
-    return item ? item->asMap() : nullptr;
+const AttribMap* findOnlyCurve(const base::IPlugin& channel) {
+    const base::AttribArray* curves = find(channel, keyframeChannel_schema::n_curves);
+    return curves && curves->size() == 1 ? findItemMap(*curves, 0) : nullptr;
 }
 
 bool readCurve(const base::IPlugin& channel, CurveData& data) {
@@ -83,7 +81,7 @@ bool readCurve(const base::IPlugin& channel, CurveData& data) {
                  channel);
         return false;
     }
-    if (const AttribMap* map = findCurve(*curves, 0))
+    if (const AttribMap* map = findItemMap(*curves, 0))
         readAttributes(*map, data);
     return true;
 }

@@ -4,8 +4,6 @@
 
 #include "scene.h"
 
-#include <optional>
-
 /// Curves as their maps hold them, for what evaluates and changes them.
 namespace scene {
 
@@ -32,8 +30,8 @@ enum Interpolation : base::u8 {
     interpolateBezier = 3,
 };
 
-/// A curve of the list `curves`; null for a gap and past the end.
-base::AttribMap* findCurve(const base::AttribArray& curves, base::u32 index);
+/// The curve of a channel that has one, else null.
+const base::AttribMap* findOnlyCurve(const base::IPlugin& channel);
 
 /// Sets `data`, which is as new, to what the only curve of `channel` holds, in one pass over its
 /// map; a gap in the list is a curve without attributes. False if there is none or, which is

@@ -62,14 +62,14 @@ private:
     Attribute* attribute_;
 };
 
-base::AttribMap* findOnlyCurve(const IKeyframeChannel& channel) {
+base::AttribMap* findCurveToChange(const IKeyframeChannel& channel) {
     const base::AttribArray* curves = find(channel, keyframeChannel_schema::n_curves);
     if (curves && curves->size() > 1) {
         logCurve(base::logError, "keyframeChannel |{}| Wrong number of components in the curve!",
                  channel);
         return nullptr;
     }
-    base::AttribMap* curve = curves ? findCurve(*curves, 0) : nullptr;
+    base::AttribMap* curve = curves ? findItemMap(*curves, 0) : nullptr;
     if (!curve)
         logCurve(base::logError, "keyframeChannel |{}| Trying to set a key without any curves!",
                  channel);
@@ -135,7 +135,7 @@ template <class T>
 bool setKey(IKeyframeChannel& channel, TimeCode time, const T& value,
             const KeyTangents<T>* tangents) {
     using Schema = keyframeChannelCurve_schema;
-    base::AttribMap* curve = findOnlyCurve(channel);
+    base::AttribMap* curve = findCurveToChange(channel);
     if (!curve || !canTakeKey<T>(*curve, channel))
         return false;
 

@@ -38,10 +38,8 @@ AttribMap* findListItem(const AttribMap& mesh, const SchemaAttribute<Items>& lis
     const Attribute* attribute = mesh.findAttribute(list);
     if (!attribute)
         return nullptr;
-    if (const AttribArray* items = attribute->asArray()) {
-        Attribute* item = items->item(index);
-        return item ? item->asMap() : nullptr;
-    }
+    if (const AttribArray* items = attribute->asArray())
+        return findItemMap(*items, index);
     const auto* objects = mesh.findVecAttribute<Object>(list);
     return objects && index < objects->size() ? (*objects)[index].get() : nullptr;
 }

@@ -37,7 +37,8 @@ TEST(Lights, BecomeRecordsWithTheirFallOff) {
                 {2, 1, 1, 0.1f, 60, "2: 1 1 1 / 1 20 100 / 60"},
                 {3, 1, 1, 0, 60, "3: 1 1 1 / 0 0 1 / 90", rectangle},
                 {4, 1, 1, 4, 60, "4: 1 1 1 / 0 0 0 / 180"},
-                {2, inf, 7, -inf, NAN, "2: 1 1 1 / 1 20 100 / 90", endless},
+                {2, inf, 7, -inf, NAN, "2: 7 7 7 / 1 20 100 / 90", endless},
+                {1, 0.5f, NAN, 4, 60, "3: 1 0.5 1 / 1 0.5 0.0625 / 180", endless},
                 {0, 1e30f, 1e30f, 4, 60, "1: 1 1 1 / 0 0 0 / 180", endless}};
     for (const auto& row : rows) {
         SCOPED_TRACE(&row - rows);

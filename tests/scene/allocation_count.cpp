@@ -14,7 +14,6 @@ extern "C" {
 // The names by which the system's library lets others take the place of its allocator.
 void* __libc_malloc(std::size_t byteCount);
 void* __libc_calloc(std::size_t count, std::size_t byteCount);
-void* __libc_realloc(void* block, std::size_t byteCount);
 }
 
 namespace {
@@ -30,12 +29,6 @@ extern "C" __attribute__((visibility("default"))) void* calloc(std::size_t count
                                                                std::size_t byteCount) {
     ++calls;
     return __libc_calloc(count, byteCount);
-}
-
-extern "C" __attribute__((visibility("default"))) void* realloc(void* block,
-                                                                std::size_t byteCount) {
-    ++calls;
-    return __libc_realloc(block, byteCount);
 }
 
 long test_support::allocationCount() {

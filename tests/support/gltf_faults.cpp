@@ -40,6 +40,14 @@ public:
         for (unsigned i = 0; i < file_.count("images"); ++i) {
             checkImage(i);
         }
+        for (unsigned i = 0; i < file_.count("animations"); ++i) {
+            for (const Value& sampler : file_.element("animations", i)["samplers"].GetArray()) {
+                checkKeyTimes(sampler["input"].GetUint());
+            }
+        }
+        for (unsigned i = 0; i < file_.count("nodes"); ++i) {
+            checkSkin(i);
+        }
         return std::move(faults_);
     }
 
@@ -109,6 +117,32 @@ private:
         }
         if (object.HasMember("indices")) {
             checkCount(object["indices"].GetUint(), primitive.indices.size());
+        }
+    }
+
+    void checkKeyTimes(unsigned index) {
+        const std::vector<double> times = file_.accessor(index).values;
+        const auto notAbove = [](double a, double b) { return a >= b; };
+        if (std::adjacent_find(times.begin(), times.end(), notAbove) != times.end()) {
+            add("key-times", "accessors", index, "has times that do not rise");
+        }
+    }
+
+    /// The joints that the vertices of a node's mesh name are those of the node's skin.
+    void checkSkin(unsigned index) {
+        const Value& node = file_.element("nodes", index);
+        if (!node.HasMember("skin") || !node.HasMember("mesh")) {
+            return;
+        }
+        const auto joints = file_.element("skins", node["skin"].GetUint())["joints"].Size();
+        const unsigned mesh = node["mesh"].GetUint();
+        const auto primitives = file_.element("meshes", mesh)["primitives"].Size();
+        for (rapidjson::SizeType i = 0; i < primitives; ++i) {
+            const std::vector<double> named =
+                file_.primitive(mesh, i).attributes["JOINTS_0"].values;
+            if (named.empty() || *std::max_element(named.begin(), named.end()) >= joints) {
+                add("joints", "nodes", index, "has a skin without joints that its vertices name");
+            }
         }
     }
 

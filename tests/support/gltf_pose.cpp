@@ -26,21 +26,20 @@ size_t requireIndex(const Value& object, const char* name) {
 }
 
 /// The values of a channel at a time: `size` numbers, linear between keys, a rotation on a sphere.
-std::vector<double> evaluate(const AccessorValues& input, const AccessorValues& output, size_t size,
-                             bool isRotation, double seconds) {
-    if (input.count == 0 || output.values.size() != input.count * size) {
+std::vector<double> evaluate(const AnimationChannel& channel, size_t size, double seconds) {
+    const std::vector<double>& times = channel.times;
+    const std::vector<double>& values = channel.values.values;
+    if (times.empty() || values.size() != times.size() * size) {
         throw GltfError("an animation sampler of unequal lengths");
     }
-    const auto after = std::upper_bound(input.values.begin(), input.values.end(), seconds);
-    const auto next = static_cast<size_t>(after - input.values.begin());
-    const double* b = output.values.data() + std::min(next, input.count - 1) * size;
-    const double* a = next == 0 ? b : output.values.data() + (next - 1) * size;
-    const bool isBetween = next > 0 && next < input.count;
-    const double u = isBetween ? (seconds - input.values[next - 1]) /
-                                     (input.values[next] - input.values[next - 1])
-                               : 0;
+    const auto after = std::upper_bound(times.begin(), times.end(), seconds);
+    const auto next = static_cast<size_t>(after - times.begin());
+    const double* b = values.data() + std::min(next, times.size() - 1) * size;
+    const double* a = next == 0 ? b : values.data() + (next - 1) * size;
+    const bool isBetween = next > 0 && next < times.size();
+    const double u = isBetween ? (seconds - times[next - 1]) / (times[next] - times[next - 1]) : 0;
     std::vector<double> result(a, a + size);
-    if (isRotation) {
+    if (channel.path == "rotation") {
         const Quaternion turned = slerp({a[0], a[1], a[2], a[3]}, {b[0], b[1], b[2], b[3]}, u);
         return {turned.begin(), turned.end()};
     }
@@ -83,14 +82,37 @@ Vector vectorAt(const AccessorValues& values, size_t index) {
 
 } // namespace
 
+std::vector<AnimationChannel> animationChannels(const GltfFile& file) {
+    std::vector<AnimationChannel> result;
+    if (file.count("animations") == 0) {
+        return result;
+    }
+    const Value& animation = file.element("animations", 0);
+    const Value& samplers = requireMember(animation, "samplers");
+    for (const Value& object : requireMember(animation, "channels").GetArray()) {
+        const size_t index = requireIndex(object, "sampler");
+        if (index >= samplers.Size()) {
+            throw GltfError("a channel without a sampler");
+        }
+        const Value& sampler = samplers[static_cast<rapidjson::SizeType>(index)];
+        const auto interpolation = sampler.FindMember("interpolation");
+        if (interpolation != sampler.MemberEnd() &&
+            std::strcmp(interpolation->value.GetString(), "LINEAR") != 0) {
+            throw GltfError("an interpolation that is not linear");
+        }
+        const Value& target = requireMember(object, "target");
+        const size_t input = requireIndex(sampler, "input");
+        result.push_back({requireIndex(target, "node"), requireMember(target, "path").GetString(),
+                          static_cast<int>(input), file.accessor(input).values,
+                          file.accessor(requireIndex(sampler, "output"))});
+    }
+    return result;
+}
+
 std::vector<double> keyTimes(const GltfFile& file) {
     std::set<double> times;
-    if (file.count("animations") > 0) {
-        for (const Value& sampler :
-             requireMember(file.element("animations", 0), "samplers").GetArray()) {
-            const AccessorValues input = file.accessor(requireIndex(sampler, "input"));
-            times.insert(input.values.begin(), input.values.end());
-        }
+    for (const AnimationChannel& channel : animationChannels(file)) {
+        times.insert(channel.times.begin(), channel.times.end());
     }
     return {times.begin(), times.end()};
 }
@@ -102,9 +124,7 @@ GltfPose::GltfPose(const GltfFile& file, double seconds)
     for (size_t i = 0; i < file.count("nodes"); ++i) {
         placements.push_back(placementOf(file.element("nodes", i)));
     }
-    if (file.count("animations") > 0) {
-        applyAnimation(placements, seconds);
-    }
+    applyAnimation(placements, seconds);
     std::vector<Matrix> locals = file.localMatrices();
     for (size_t i = 0; i < locals.size(); ++i) {
         if (isPlaced_[i]) {
@@ -118,30 +138,15 @@ GltfPose::GltfPose(const GltfFile& file, double seconds)
 }
 
 void GltfPose::applyAnimation(std::vector<Placement>& placements, double seconds) {
-    const Value& animation = file_.element("animations", 0);
-    const Value& samplers = requireMember(animation, "samplers");
-    for (const Value& channel : requireMember(animation, "channels").GetArray()) {
-        const size_t index = requireIndex(channel, "sampler");
-        if (index >= samplers.Size()) {
-            throw GltfError("a channel without a sampler");
-        }
-        const Value& sampler = samplers[static_cast<rapidjson::SizeType>(index)];
-        const auto interpolation = sampler.FindMember("interpolation");
-        if (interpolation != sampler.MemberEnd() &&
-            std::strcmp(interpolation->value.GetString(), "LINEAR") != 0) {
-            throw GltfError("an interpolation that is not linear");
-        }
-        const Value& target = requireMember(channel, "target");
-        const size_t node = requireIndex(target, "node");
-        const std::string path = requireMember(target, "path").GetString();
+    for (const AnimationChannel& channel : animationChannels(file_)) {
+        const size_t node = channel.node;
+        const std::string& path = channel.path;
         const size_t size =
             path == "rotation" ? 4
             : path != "weights"
                 ? 3
                 : targetCount(file_, requireIndex(file_.element("nodes", node), "mesh"));
-        const std::vector<double> values = evaluate(file_.accessor(requireIndex(sampler, "input")),
-                                                    file_.accessor(requireIndex(sampler, "output")),
-                                                    size, size == 4 && path == "rotation", seconds);
+        const std::vector<double> values = evaluate(channel, size, seconds);
         if (path == "weights") {
             weights_.at(node) = values;
             continue;

@@ -4,6 +4,18 @@
 
 namespace test_support {
 
+/// A channel of a file's first animation. Its values are linear between the keys.
+struct AnimationChannel {
+    size_t node = 0;
+    std::string path;
+    int input = -1; ///< the accessor of `times`
+    std::vector<double> times;
+    AccessorValues values;
+};
+
+/// Throws `GltfError` for other interpolations.
+std::vector<AnimationChannel> animationChannels(const GltfFile& file);
+
 /// The times in seconds of all keys of a file's first animation, sorted, each once.
 std::vector<double> keyTimes(const GltfFile& file);
 

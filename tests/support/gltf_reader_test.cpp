@@ -237,6 +237,7 @@ Bytes rigBytes() {
 
 TEST(GltfPose, MovesJointsAndTargets) {
     const GltfFile file = GltfFile::fromBinary(makeGlb(padded(rigJson), rigBytes()));
+    EXPECT_TRUE(findFaults(file).empty());
     EXPECT_EQ(keyTimes(file), (std::vector<double>{0, 2}));
     const double h = std::sqrt(0.5);
     // The third vertex lies half way between where the two joints take it: (0, 4) and (0, 2) plus
@@ -254,6 +255,25 @@ TEST(GltfPose, MovesJointsAndTargets) {
             EXPECT_LT(length(drawn[v] - expected[v]), 1e-6) << "vertex " << v << " at " << seconds;
         }
     }
+}
+
+TEST(GltfPose, FaultsOfMovementAreFound) {
+    const auto faultsOf = [](size_t offset, uint8_t value) {
+        Bytes bytes = rigBytes();
+        bytes.at(offset) = value;
+        std::string kinds;
+        for (const Fault& fault :
+             findFaults(GltfFile::fromBinary(makeGlb(padded(rigJson), bytes)))) {
+            kinds += fault.kind + " ";
+        }
+        return kinds;
+    };
+    EXPECT_EQ(faultsOf(40, 1), "");
+    EXPECT_EQ(faultsOf(40, 2), "joints ");
+    // The second time is 2.0f, 0x40000000: with other highest bytes 0.5, 0 and -0.
+    EXPECT_EQ(faultsOf(231, 0x3F), "");
+    EXPECT_EQ(faultsOf(231, 0), "key-times key-times ");
+    EXPECT_EQ(faultsOf(231, 0x80), "key-times key-times ");
 }
 
 } // namespace

@@ -2,8 +2,10 @@
 
 #include "scene_animation.h"
 #include "scene_factory.h"
+#include "scene_keyframe.h"
 #include "scene_schema.h"
 
+#include <cmath>
 #include <stdexcept>
 
 namespace test_support {
@@ -50,6 +52,29 @@ inline base::AttribMap& appendItem(base::AttribMap& object,
     auto* item = new base::AttribMap;
     write(object, list).append(item);
     return *item;
+}
+
+/// The nearest tick.
+inline base::TimeCode secondsToTime(double seconds) {
+    return {std::llround(seconds * static_cast<double>(base::TimeCode::ticksPerSecond))};
+}
+
+/// The first curve of `channel`, made where it has none.
+inline base::AttribMap& curveOf(scene::IKeyframeChannel& channel) {
+    return *channel.attribute(1, scene::keyframeChannel_schema::n_curves);
+}
+
+/// Gives `channel` a curve with keys at so many seconds.
+template <class T>
+base::AttribMap& setKeys(scene::IKeyframeChannel& channel, std::initializer_list<double> seconds,
+                         base::vector<T> values) {
+    base::AttribMap& curve = curveOf(channel);
+    auto& times = write(curve, scene::keyframeChannelCurve_schema::n_times);
+    times.clear();
+    for (const double second : seconds)
+        times.push_back(secondsToTime(second));
+    curve.vecAttribute<T>(scene::keyframeChannelCurve_schema::n_values) = std::move(values);
+    return curve;
 }
 
 /// Appends a primitive of faces with `corners` corners each: all of the index array, or `count`
