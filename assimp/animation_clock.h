@@ -10,12 +10,12 @@ namespace assimp {
 /// Turns the times of one animation's keys into ticks of the framework.
 class AnimationClock {
 public:
+    /// `framesPerSecond` is above 0.
     AnimationClock(const aiAnimation& animation, base::u32 framesPerSecond);
 
     /// False for a time that is not finite or too far from zero to be any. A time very close to a
     /// whole frame is put on it: files hold rounded ones.
     bool read(double fileTime, base::TimeCode& time) const;
-    base::i64 frameTicks() const { return frameTicks_; }
 
 private:
     double ticksPerSecond_; ///< of the file

@@ -34,9 +34,9 @@ void findRange(const aiAnimation& animation, const AnimationClock& clock, ClipTr
     }
     for (const auto& [target, track] : std::as_const(clip.weights))
         include(track, clip, isFirst);
-    // A clip may stand still at its end.
+    clip.end = clip.last;
     if (TimeCode end; clock.read(animation.mDuration, end))
-        clip.last = std::max(clip.last, end);
+        clip.end = std::max(clip.end, end);
 }
 
 /// Sets `meshes` to those that a channel means: those of the node "n" for the "n*0" of FBX, where

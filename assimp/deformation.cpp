@@ -5,6 +5,7 @@
 #include "scene_schema.h"
 #include "scene_weld.h"
 
+#include <algorithm>
 #include <bit>
 
 namespace assimp {

@@ -47,9 +47,9 @@ namespace {
 class AnimationImport {
 public:
     AnimationImport(const NodeTable& nodes, const vector<MorphedMesh>& morphs,
-                    const vector<ClipTracks>& clips, const MotionSampling& sampling,
-                    LayerMaker& layer, AnimationFaults& faults)
-        : nodes_(nodes), morphs_(morphs), clips_(clips), sampling_(sampling), layer_(layer),
+                    const vector<ClipTracks>& clips, FrameSampler& frames, LayerMaker& layer,
+                    AnimationFaults& faults)
+        : nodes_(nodes), morphs_(morphs), clips_(clips), frames_(frames), layer_(layer),
           faults_(faults) {}
 
     void run() {
@@ -67,6 +67,7 @@ private:
     vector<const aiNode*> findChain(const aiNode& node) const;
     NodeMotion composeClip(const ClipTracks& clip, const vector<const aiNode*>& chain);
     void animateNode(IPlugin& node, const vector<const aiNode*>& chain);
+    bool bake(const KeyTrack<float>& track, KeyTrack<float>& sampled);
     void animateMorphs();
 
     /// The tracks of one property in all clips; null where there are no keys.
@@ -92,7 +93,7 @@ private:
     const NodeTable& nodes_;
     const vector<MorphedMesh>& morphs_;
     const vector<ClipTracks>& clips_;
-    const MotionSampling& sampling_;
+    FrameSampler& frames_;
     LayerMaker& layer_;
     AnimationFaults& faults_;
 };
@@ -123,7 +124,7 @@ NodeMotion AnimationImport::composeClip(const ClipTracks& clip,
         factors.back().motion = &found->second;
         isMoved = true;
     }
-    return isMoved ? composeMotion(factors, sampling_, faults_.motion) : NodeMotion();
+    return isMoved ? composeMotion(factors, frames_, faults_.shearedNodes) : NodeMotion();
 }
 
 void AnimationImport::animateNode(IPlugin& node, const vector<const aiNode*>& chain) {
@@ -134,21 +135,21 @@ void AnimationImport::animateNode(IPlugin& node, const vector<const aiNode*>& ch
     const auto rotations = select(motions, &NodeMotion::rotation);
     const auto scales = select(motions, &NodeMotion::scale);
 
-    bool repaired = false;
-    const base::mat43 matrix = scene::composeTransform(node, repaired);
-    const scene::TransformParts rest = scene::decomposeTransform(matrix);
-    base::vec3d translation = matrix.t;
-    base::quatf rotation = rest.rotation;
-    base::vec3f scale = rest.scale;
+    const base::vec3d restTranslation = read(node, node_schema::n_translate);
+    const base::quatf restRotation = read(node, node_schema::n_rotate);
+    const base::vec3f restScale = read(node, node_schema::n_scale);
+    base::vec3d translation = restTranslation;
+    base::quatf rotation = restRotation;
+    base::vec3f scale = restScale;
     const bool standsStill = takeConstant(translations, translation);
     const bool keepsRotation = takeConstant(rotations, rotation);
     const bool keepsScale = takeConstant(scales, scale);
-    const bool isAsAtRest = areAlike(translation, matrix.t) && areAlike(rotation, rest.rotation) &&
-                            areAlike(scale, rest.scale);
+    const bool isAsAtRest = areAlike(translation, restTranslation) &&
+                            areAlike(rotation, restRotation) && areAlike(scale, restScale);
     if (standsStill && keepsRotation && keepsScale && isAsAtRest)
         return; // and keeps its shear
 
-    // Shear and a single negative scale would not go with the values of the channels.
+    // Shear would not go with the values of the channels.
     node.removeAttribute(node_schema::n_shear);
     writeUnlessDefault(node, node_schema::n_translate, translation);
     writeUnlessDefault(node, node_schema::n_rotate, rotation);
@@ -161,6 +162,18 @@ void AnimationImport::animateNode(IPlugin& node, const vector<const aiNode*>& ch
         layer_.animate(node, node_schema::n_rotate, name + ".rotate", rotations, rotation);
     if (!keepsScale)
         layer_.animate(node, node_schema::n_scale, name + ".scale", scales, scale);
+}
+
+/// Sets `sampled` to `track` with a key on every frame. False if that is not wanted or not
+/// possible.
+bool AnimationImport::bake(const KeyTrack<float>& track, KeyTrack<float>& sampled) {
+    if (!frames_.everyFrame() || track.values.size() < 2)
+        return false;
+    const vector<TimeCode> frames = frames_.listFrames(track.times.front(), track.times.back(), 1);
+    if (frames.empty())
+        return false;
+    sampled = resample(track, frames);
+    return true;
 }
 
 void AnimationImport::animateMorphs() {
@@ -176,16 +189,9 @@ void AnimationImport::animateMorphs() {
         AttribMap* item = findListItem(*morphs_[target.first].morph, scene::morph_schema::n_targets,
                                        target.second);
         vector<KeyTrack<float>> sampled(tracks.size());
-        for (std::size_t i = 0; sampling_.everyFrame && i < tracks.size(); ++i) {
-            if (!tracks[i] || tracks[i]->values.size() < 2)
-                continue;
-            bool isTooLong = false;
-            sampled[i] =
-                resample(*tracks[i], listFrames(tracks[i]->times.front(), tracks[i]->times.back(),
-                                                sampling_.frameTicks, isTooLong));
-            faults_.motion.longMotions += isTooLong;
-            tracks[i] = &sampled[i];
-        }
+        for (std::size_t i = 0; i < tracks.size(); ++i)
+            if (tracks[i] && bake(*tracks[i], sampled[i]))
+                tracks[i] = &sampled[i];
         float& weight = write(*item, Item::n_weight);
         const float rest = weight;
         const IPlugin* mesh = findObject(*item, Item::n_targetMesh);
@@ -235,10 +241,10 @@ void importAnimations(const aiScene& source, const AnimationSettings& settings, 
     AnimationFaults faults;
     const vector<ClipTracks> clips = readClips(animations, framesPerSecond, nodes, morphs, faults);
     if (!clips.empty()) {
-        const MotionSampling sampling{TimeCode::ticksPerSecond / framesPerSecond,
-                                      settings.everyFrame};
+        FrameSampler frames(TimeCode::ticksPerSecond / framesPerSecond, settings.everyFrame);
         LayerMaker layer(clips, factory);
-        AnimationImport(nodes, morphs, clips, sampling, layer, faults).run();
+        AnimationImport(nodes, morphs, clips, frames, layer, faults).run();
+        faults.longMotions = frames.longMotions();
         layer.finish(scene, framesPerSecond);
     }
     faults.report(path);

@@ -33,7 +33,8 @@ bool isRootAnimated(const aiScene& source);
 ///
 /// The animations become clips one after the other: the first at the times of the file, but not
 /// before 0, each of the others from the first whole frame on that lies a frame or more behind the
-/// end of the one before. A clip that does not move what others do holds its value at rest.
+/// last key of the one before. How long the file says that the last one takes counts for the range
+/// alone. A clip that does not move what others do holds its value at rest.
 void importAnimations(const aiScene& source, const AnimationSettings& settings, NodeTable& nodes,
                       const base::vector<MorphedMesh>& morphs, base::IPlugin& scene,
                       base::PluginFactory& factory, const base::string& path);

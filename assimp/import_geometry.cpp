@@ -1,11 +1,11 @@
 #include "assimp/import_geometry.h"
 
 #include "assimp/deformation.h"
+#include "assimp/fault_report.h"
 #include "assimp/import_polygons.h"
 #include "assimp/library_text.h"
 #include "assimp/vertex_selection.h"
 
-#include "b_log.h"
 #include "scene_mesh_index.h"
 #include "scene_schema.h"
 
@@ -41,26 +41,24 @@ GeometrySettings::GeometrySettings(const AttribMap& importer) {
 }
 
 void GeometryFaults::report(const base::string& path) const {
-    const auto tell = [&](int level, u64 count, const char* text) {
-        if (count != 0)
-            base::log().log(base::logScene, level, text, path, count);
-    };
-    tell(base::logInformation, degenerateFaces, "assimp |{}| Left out {} faces without area.");
-    tell(base::logWarning, brokenFaces,
-         "assimp |{}| Left out {} faces with an index out of range or more than 65535 corners!");
-    tell(base::logWarning, nonFiniteValues,
-         "assimp |{}| Found {} vertex values that are no finite numbers, zero is taken!");
-    tell(base::logWarning, zeroNormals,
-         "assimp |{}| Found {} normals without a direction, those of the faces are taken!");
-    tell(base::logWarning, zeroTangents,
-         "assimp |{}| Found {} tangents without a direction, any are taken!");
-    tell(base::logWarning, colorsOutOfRange,
-         "assimp |{}| Found {} colors with components outside 0 to 1, the nearest are taken!");
-    tell(base::logWarning, brokenTargets,
-         "assimp |{}| Left out {} morph targets with a wrong number of vertices!");
-    tell(base::logWarning, stages,
-         "assimp |{}| Found {} morph targets that are stages on the way to another, their weights "
-         "stay at 0!");
+    const FaultReport log(path);
+    log.inform(degenerateFaces, "assimp |{}| Left out {} faces without area.");
+    log.warn(
+        brokenFaces,
+        "assimp |{}| Left out {} faces with an index out of range or more than 65535 corners!");
+    log.warn(nonFiniteValues,
+             "assimp |{}| Found {} vertex values that are no finite numbers, zero is taken!");
+    log.warn(zeroNormals,
+             "assimp |{}| Found {} normals without a direction, those of the faces are taken!");
+    log.warn(zeroTangents, "assimp |{}| Found {} tangents without a direction, any are taken!");
+    log.warn(colorsOutOfRange,
+             "assimp |{}| Found {} colors with components outside 0 to 1, the nearest are taken!");
+    log.warn(brokenTargets,
+             "assimp |{}| Left out {} morph targets with a wrong number of vertices!");
+    log.warn(
+        stages,
+        "assimp |{}| Found {} morph targets that are stages on the way to another, their weights "
+        "stay at 0!");
 }
 
 vector<vec4f> readColors(const aiColor4D* elements, const VertexSelection& selection,

@@ -1,10 +1,10 @@
 #include "assimp/import_lights.h"
 
 #include "assimp/attribute_writing.h"
+#include "assimp/fault_report.h"
 #include "assimp/library_text.h"
 #include "assimp/placed_node.h"
 
-#include "b_log.h"
 #include "scene_schema.h"
 
 #include <assimp/scene.h>
@@ -120,12 +120,9 @@ void importLights(const aiScene& source, double metresPerUnit, NodeTable& nodes,
         }
         addPlaced(*object, placement, makeLight(light, kind, metresPerUnit, factory), factory);
     }
-    const auto tell = [&](base::u64 count, const char* text) {
-        if (count != 0)
-            base::log().log(base::logScene, base::logWarning, text, path, count);
-    };
-    tell(strayCount, "assimp |{}| Left out {} lights without a node of their name!");
-    tell(unknownCount, "assimp |{}| Left out {} ambient lights or lights of unknown kind!");
+    const FaultReport log(path);
+    log.warn(strayCount, "assimp |{}| Left out {} lights without a node of their name!");
+    log.warn(unknownCount, "assimp |{}| Left out {} ambient lights or lights of unknown kind!");
 }
 
 } // namespace assimp

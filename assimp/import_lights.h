@@ -14,9 +14,11 @@ namespace assimp {
 /// |---|---|
 /// | diffuse color | `color`, at most 1, times `intensity` |
 /// | outer cone, inner cone | `spotConeAngle`, the difference as `spotPenumbraAngle` |
-/// | constant c, linear l, quadratic q attenuation | `size` s that gives (1 + d / s)^2 at distance
-/// d the shape of c + l d + q d^2: the root of c / q, else 2 c / l; 0 for q alone | | width and
-/// height of an area | `size`, and `sizeRatio`: height by width |
+/// | constant c, linear l, quadratic q | `size`, see below |
+/// | width and height of an area | `size`, and `sizeRatio`: height by width |
+///
+/// The size s gives (1 + d / s)^2 at distance d the shape of c + l d + q d^2: the root of c / q,
+/// else 2 c / l; 0 for q alone.
 void importLights(const aiScene& source, double metresPerUnit, NodeTable& nodes,
                   base::PluginFactory& factory, const base::string& path);
 

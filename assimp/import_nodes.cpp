@@ -1,5 +1,6 @@
 #include "assimp/import_nodes.h"
 
+#include "assimp/library_matrix.h"
 #include "assimp/library_text.h"
 
 #include "b_log.h"
@@ -8,9 +9,6 @@
 
 #include <assimp/ColladaMetaData.h>
 #include <assimp/scene.h>
-
-#include <algorithm>
-#include <cmath>
 
 namespace assimp {
 
@@ -24,15 +22,9 @@ namespace {
 /// A node of the file that waits to be made.
 struct Pending {
     const aiNode* source;
-    base::IPlugin* parent;     ///< null for the root
-    mat43 parentFromChain;     ///< what comes in front of the source's own transform
-    const aiNode* factorAbove; ///< the last node of that chain, null if there is none
+    base::IPlugin* parent; ///< null for the root
+    mat43 parentFromChain; ///< what comes in front of the source's own transform
 };
-
-bool hasFiniteTransform(const aiNode& node) {
-    const float* values = &node.mTransformation.a1;
-    return std::all_of(values, values + 12, [](float v) { return std::isfinite(v); });
-}
 
 /// The name in the file; empty where assimp made one up.
 base::string nameOf(const aiNode& node) {
@@ -53,7 +45,7 @@ void reportTransform(const aiNode& node) {
         base::log().log(base::logScene, base::logWarning, text, nameOf(node));
     };
     const aiMatrix4x4& m = node.mTransformation;
-    if (!hasFiniteTransform(node))
+    if (mat43 matrix; !readMatrix(m, matrix))
         warn("assimp |{}| The transform has numbers that are not finite, the identity is taken!");
     else if (m.d1 != 0 || m.d2 != 0 || m.d3 != 0 || m.d4 != 1)
         warn("assimp |{}| The transform is not affine, its last row is left out!");
@@ -78,16 +70,10 @@ base::ref<base::IPlugin> importNode(const aiNode& source, const mat43& transform
 
 } // namespace
 
-bool isTransformFactor(const aiNode& node) {
-    return node.mNumChildren != 0 && node.mNumMeshes == 0 &&
-           viewOf(node.mName).find("_$AssimpFbx$_") != string_view::npos;
-}
-
 mat43 readTransform(const aiNode& node) {
-    const aiMatrix4x4& m = node.mTransformation;
-    if (!hasFiniteTransform(node))
-        return {};
-    return {{{m.a1, m.a2, m.a3}, {m.b1, m.b2, m.b3}, {m.c1, m.c2, m.c3}}, {m.a4, m.b4, m.c4}};
+    mat43 matrix;
+    readMatrix(node.mTransformation, matrix);
+    return matrix;
 }
 
 base::ref<base::IPlugin> importNodes(const aiNode& root, const mat43& rootTransform,
@@ -95,17 +81,15 @@ base::ref<base::IPlugin> importNodes(const aiNode& root, const mat43& rootTransf
                                      base::PluginFactory& factory, NodeTable& nodes) {
     base::ref<base::IPlugin> result;
     // Not by recursion: files may nest nodes very deep.
-    base::vector<Pending> pending{{&root, nullptr, rootTransform, nullptr}};
+    base::vector<Pending> pending{{&root, nullptr, rootTransform}};
     while (!pending.empty()) {
-        auto [source, parent, transform, factorAbove] = std::as_const(pending).back();
+        auto [source, parent, transform] = std::as_const(pending).back();
         pending.pop_back();
         reportTransform(*source);
-        if (factorAbove)
-            nodes.addFactorAbove(*source, *factorAbove);
         transform = scene::multiply(transform, readTransform(*source));
-        if (parent && isTransformFactor(*source)) {
+        if (nodes.isFactor(*source)) {
             for (u32 i = source->mNumChildren; i-- > 0;)
-                pending.push_back({source->mChildren[i], parent, transform, source});
+                pending.push_back({source->mChildren[i], parent, transform});
             continue;
         }
         base::ref<base::IPlugin> node = importNode(*source, transform, geometry, factory);
@@ -115,7 +99,7 @@ base::ref<base::IPlugin> importNodes(const aiNode& root, const mat43& rootTransf
         else
             result = node;
         for (u32 i = source->mNumChildren; i-- > 0;)
-            pending.push_back({source->mChildren[i], node.get(), {}, nullptr});
+            pending.push_back({source->mChildren[i], node.get(), {}});
     }
     return result;
 }

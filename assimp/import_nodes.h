@@ -18,10 +18,6 @@ base::ref<base::IPlugin> importNodes(const aiNode& root, const base::mat43& root
                                      const base::vector<GeometryObjects>& geometry,
                                      base::PluginFactory& factory, NodeTable& nodes);
 
-/// True for a helper node that stands for one factor of its children's transforms, unless it is the
-/// root.
-bool isTransformFactor(const aiNode& node);
-
 /// The transform of a node relative to its parent in the file; the identity where it is not finite.
 base::mat43 readTransform(const aiNode& node);
 

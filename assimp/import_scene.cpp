@@ -33,6 +33,10 @@ struct ImportedMeshes {
     base::vector<MorphedMesh> morphs;
 };
 
+base::string extensionOf(const base::string& path) {
+    return base::toLower(base::fs::extension(path));
+}
+
 /// The morph object among those of `mesh`, if there is one.
 MorphedMesh findMorph(const aiMesh& mesh, const GeometryObjects& objects, bool inGroups) {
     MorphedMesh result{nullptr, base::string(viewOf(mesh.mName)), {}};
@@ -52,16 +56,16 @@ ImportedMeshes importMeshes(aiScene& source, const GeometrySettings& settings,
                             SkeletonImport* skeletons, const base::string& path) {
     ImportedMeshes meshes;
     GeometryFaults faults;
-    const bool inGroups = base::toLower(base::fs::extension(path)) == "fbx";
+    const bool inGroups = extensionOf(path) == "fbx";
     for (base::u32 i = 0; i < source.mNumMeshes; ++i) {
         const aiMesh& mesh = *source.mMeshes[i];
-        VertexJoints joints = skeletons ? skeletons->readJoints(mesh) : VertexJoints();
+        BoundMesh bound = skeletons ? skeletons->readJoints(mesh) : BoundMesh();
         GeometryObjects objects =
-            importGeometry(mesh, settings, std::move(joints), inGroups, factory, faults);
+            importGeometry(mesh, settings, std::move(bound.joints), inGroups, factory, faults);
         if (materials)
             materials->assign(mesh, objects);
         if (skeletons)
-            skeletons->addObjects(objects);
+            skeletons->addObjects(bound, objects);
         meshes.morphs.push_back(findMorph(mesh, objects, inGroups));
         meshes.geometry.push_back(std::move(objects));
         delete source.mMeshes[i];
@@ -92,6 +96,17 @@ double findScale(const base::IPlugin& root) {
     return scale > 0 ? scale : 1;
 }
 
+base::ref<base::IPlugin> makeScene(const base::string& path, base::ref<base::IPlugin> root,
+                                   base::u8 upAxis, base::PluginFactory& factory) {
+    using Schema = scene::scene_schema;
+    base::ref<base::IPlugin> object = factory.create(Schema::n_kind);
+    write(*object, Schema::n_name) = base::fs::stem(path);
+    write(*object, Schema::n_root) = std::move(root);
+    if (upAxis != Schema::n_upAxis.defaultValue)
+        write(*object, Schema::n_upAxis) = upAxis;
+    return object;
+}
+
 /// Makes the scene keep an object of the import's as long as it lives.
 void keep(base::IPlugin& scene, const base::ref<base::IPlugin>& object) {
     const base::name_id name = base::nameServer().id("importedPictures");
@@ -111,14 +126,14 @@ void importScene(aiScene& source, const base::AttribMap& importer, const base::s
     std::optional<MaterialImport> materials;
     if (read(importer, Settings::n_importMaterials))
         materials.emplace(source, path, importer, factory);
-    NodeTable nodes(*source.mRootNode);
+    const base::string extension = extensionOf(path);
+    NodeTable nodes(*source.mRootNode, extension == "fbx");
     std::optional<SkeletonImport> skeletons;
     if (read(importer, Settings::n_importSkeletons))
         skeletons.emplace(nodes);
     const ImportedMeshes meshes =
         importMeshes(source, GeometrySettings(importer), factory, materials ? &*materials : nullptr,
                      skeletons ? &*skeletons : nullptr, path);
-    const base::string extension = base::toLower(base::fs::extension(path));
     const SceneAxes axes = readAxes(source, extension == "dae" || extension == "3ds");
     const AnimationSettings animation(importer);
     const bool isAnimated = animation.animations && isRootAnimated(source);
@@ -136,12 +151,7 @@ void importScene(aiScene& source, const base::AttribMap& importer, const base::s
     if (read(importer, Settings::n_importCameras))
         importCameras(source, nodes, factory, path);
 
-    using Schema = scene::scene_schema;
-    const base::ref<base::IPlugin> object = factory.create(Schema::n_kind);
-    write(*object, Schema::n_name) = base::fs::stem(path);
-    write(*object, Schema::n_root) = std::move(root);
-    if (axes.upAxis != Schema::n_upAxis.defaultValue)
-        write(*object, Schema::n_upAxis) = axes.upAxis;
+    const base::ref<base::IPlugin> object = makeScene(path, std::move(root), axes.upAxis, factory);
     importAnimations(source, animation, nodes, meshes.morphs, *object, factory, path);
     nodes.reportSharedNames(path);
     if (materials) {

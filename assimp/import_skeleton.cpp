@@ -1,17 +1,13 @@
 #include "assimp/import_skeleton.h"
 
 #include "assimp/attribute_writing.h"
-#include "assimp/import_nodes.h"
+#include "assimp/library_matrix.h"
 #include "assimp/library_text.h"
 
 #include "scene_schema.h"
 
 #include <assimp/mesh.h>
 #include <assimp/scene.h>
-
-#include <algorithm>
-#include <cmath>
-#include <span>
 
 namespace assimp {
 
@@ -28,52 +24,48 @@ namespace {
 
 /// Inverse of the bone's place in the space of the mesh; the identity where it is not finite.
 mat43 readBindPose(const aiBone& bone, SkeletonFaults& faults) {
-    const aiMatrix4x4& m = bone.mOffsetMatrix;
-    if (!std::ranges::all_of(std::span(&m.a1, 12), [](float v) { return std::isfinite(v); })) {
-        ++faults.brokenBindPoses;
-        return {};
-    }
-    return {{{m.a1, m.a2, m.a3}, {m.b1, m.b2, m.b3}, {m.c1, m.c2, m.c3}}, {m.a4, m.b4, m.c4}};
+    mat43 pose;
+    faults.brokenBindPoses += !readMatrix(bone.mOffsetMatrix, pose);
+    return pose;
 }
 
 } // namespace
 
-VertexJoints SkeletonImport::readJoints(const aiMesh& mesh) {
-    bones_.clear();
+BoundMesh SkeletonImport::readJoints(const aiMesh& mesh) {
+    BoundMesh bound;
     for (u32 i = 0; i < mesh.mNumBones; ++i) {
         const aiNode* node = nodes_.find(viewOf(mesh.mBones[i]->mName));
-        if (node && !isTransformFactor(*node))
-            bones_.push_back(mesh.mBones[i]);
+        if (node && !nodes_.isFactor(*node))
+            bound.bones.push_back(mesh.mBones[i]);
         else
             ++faults_.missingBones;
     }
-    if (bones_.empty())
-        return {};
-    VertexJoints joints = readVertexJoints(bones_, mesh.mNumVertices, faults_);
-    hasFreeVertices_ = joints.hasFreeVertices;
-    if (!joints.starts.empty())
+    if (bound.bones.empty())
+        return bound;
+    bound.joints = readVertexJoints(bound.bones, mesh.mNumVertices, faults_);
+    bound.hasFreeVertices = bound.joints.hasFreeVertices;
+    if (!bound.joints.starts.empty())
         faults_.targetsOfSkins += mesh.mNumAnimMeshes;
-    return joints;
+    return bound;
 }
 
-void SkeletonImport::addObjects(const GeometryObjects& objects) {
+void SkeletonImport::addObjects(const BoundMesh& bound, const GeometryObjects& objects) {
     for (const ref<IPlugin>& object : objects) {
-        if (bones_.empty() || !find(*object, mesh_schema::n_jointsSets))
+        if (bound.bones.empty() || !find(*object, mesh_schema::n_jointsSets))
             continue;
         vector<mat43> poses;
-        SkinnedMesh skinned{{}, hasFreeVertices_};
-        for (const aiBone* bone : std::as_const(bones_)) {
+        SkinnedMesh skinned{{}, bound.hasFreeVertices};
+        for (const aiBone* bone : bound.bones) {
             poses.push_back(readBindPose(*bone, faults_));
             skinned.joints.push_back(nodes_.find(viewOf(bone->mName)));
         }
-        if (hasFreeVertices_)
+        if (bound.hasFreeVertices)
             poses.emplace_back();
         using Schema = scene::meshBindPoseSet_schema;
         write(appendItem<Schema>(*object, mesh_schema::n_bindPoseSets), Schema::n_transforms) =
             std::move(poses);
         meshes_.emplace(object.get(), std::move(skinned));
     }
-    bones_.clear();
 }
 
 ref<IPlugin> SkeletonImport::makeSkin(const ref<IPlugin>& mesh, const SkinnedMesh& skinned,

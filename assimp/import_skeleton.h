@@ -8,6 +8,13 @@ struct aiMesh;
 
 namespace assimp {
 
+/// What a mesh of the file is bound to.
+struct BoundMesh {
+    base::vector<const aiBone*> bones; ///< of the mesh, those with a node
+    VertexJoints joints;
+    bool hasFreeVertices = false;
+};
+
 /// Binds meshes to the nodes that their bones name. Used in this order: for every mesh
 /// `readJoints` and, once its objects are made, `addObjects`; when the nodes are made, `connect`.
 ///
@@ -19,10 +26,10 @@ public:
     explicit SkeletonImport(NodeTable& nodes) : nodes_(nodes) {}
 
     /// What moves the vertices of `mesh`; none if it has no bones.
-    VertexJoints readJoints(const aiMesh& mesh);
-    /// Takes note of the objects of the mesh whose joints were read last, and writes the bind pose
-    /// of the one with a joints set. That mesh may be deleted afterwards.
-    void addObjects(const GeometryObjects& objects);
+    BoundMesh readJoints(const aiMesh& mesh);
+    /// Takes note of the objects made of a mesh, and writes the bind pose of the one with a joints
+    /// set. The mesh may be deleted afterwards; the joints of `bound` don't matter any more.
+    void addObjects(const BoundMesh& bound, const GeometryObjects& objects);
     /// Marks the joints among the nodes and gives skins to the nodes with skinned meshes.
     void connect(base::PluginFactory& factory);
 
@@ -39,8 +46,6 @@ private:
 
     NodeTable& nodes_;
     SkeletonFaults faults_;
-    base::vector<const aiBone*> bones_; ///< of the mesh that was read last, those with a node
-    bool hasFreeVertices_ = false;      ///< of that mesh
     base::hash_map<const base::IPlugin*, SkinnedMesh> meshes_;
 };
 

@@ -1,6 +1,7 @@
 #include "assimp/key_reading.h"
 
-#include "b_log.h"
+#include "assimp/fault_report.h"
+#include "assimp/quaternion.h"
 
 #include <assimp/anim.h>
 
@@ -20,28 +21,25 @@ using base::vec3f;
 using base::vector;
 
 void AnimationFaults::report(const base::string& path) const {
-    const auto tell = [&](int level, u64 count, const char* text) {
-        if (count != 0)
-            base::log().log(base::logScene, level, text, path, count);
-    };
-    tell(base::logWarning, brokenKeys,
-         "assimp |{}| Left out {} keys of animations whose times or values are no finite numbers!");
-    tell(base::logWarning, unsortedTracks,
-         "assimp |{}| Found {} animation curves whose keys are not in the order of time, they are "
-         "sorted!");
-    tell(base::logWarning, unknownTargets,
-         "assimp |{}| Left out {} animation channels of nodes or morph targets that the file does "
-         "not have!");
-    tell(base::logWarning, repeatedChannels,
-         "assimp |{}| Left out {} animation channels of nodes or morph targets that have one!");
-    tell(base::logInformation, emptyAnimations,
-         "assimp |{}| Left out {} animations without any keys.");
-    tell(base::logWarning, lateAnimations,
-         "assimp |{}| Left out {} animations, as those before are too long!");
-    tell(base::logWarning, motion.longMotions,
-         "assimp |{}| Found {} motions that are too long for keys on every frame!");
-    tell(base::logWarning, motion.shearedNodes,
-         "assimp |{}| Found {} motions with shear, which is left out!");
+    const FaultReport log(path);
+    log.warn(
+        brokenKeys,
+        "assimp |{}| Left out {} keys of animations whose times or values are no finite numbers!");
+    log.warn(
+        unsortedTracks,
+        "assimp |{}| Found {} animation curves whose keys are not in the order of time, they are "
+        "sorted!");
+    log.warn(
+        unknownTargets,
+        "assimp |{}| Left out {} animation channels of nodes or morph targets that the file does "
+        "not have!");
+    log.warn(repeatedChannels,
+             "assimp |{}| Left out {} animation channels of nodes or morph targets that have one!");
+    log.inform(emptyAnimations, "assimp |{}| Left out {} animations without any keys.");
+    log.warn(lateAnimations, "assimp |{}| Left out {} animations, as those before are too long!");
+    log.warn(longMotions,
+             "assimp |{}| Found {} motions that are too long for keys on every frame!");
+    log.warn(shearedNodes, "assimp |{}| Found {} motions with shear, which is left out!");
 }
 
 namespace {
@@ -54,10 +52,7 @@ vec3f valueOf(const aiVectorKey& key, vec3f*) {
 }
 quatf valueOf(const aiQuatKey& key, quatf*) {
     const aiQuaternion& q = key.mValue;
-    const double length =
-        std::sqrt(double(q.x) * q.x + double(q.y) * q.y + double(q.z) * q.z + double(q.w) * q.w);
-    const auto share = [&](float v) { return static_cast<float>(v / length); };
-    return {share(q.x), share(q.y), share(q.z), share(q.w)};
+    return normalized({q.x, q.y, q.z, q.w});
 }
 
 template <class T>
@@ -85,7 +80,7 @@ void sortKeys(KeyTrack<T>& track, AnimationFaults& faults) {
     std::iota(order.begin(), order.end(), 0u);
     const TimeCode* times = track.times.cbegin();
     std::ranges::stable_sort(order, [&](u32 a, u32 b) { return times[a] < times[b]; });
-    KeyTrack<T> sorted{{}, {}, track.before, track.after};
+    KeyTrack<T> sorted{{}, {}, track.preExtrapolation, track.postExtrapolation};
     for (const u32 i : std::as_const(order)) {
         sorted.times.push_back(times[i]);
         sorted.values.push_back(std::as_const(track.values)[i]);

@@ -17,7 +17,8 @@ struct AnimationFaults {
     base::u64 repeatedChannels = 0;
     base::u64 emptyAnimations = 0;
     base::u64 lateAnimations = 0;
-    MotionFaults motion;
+    base::u64 longMotions = 0;
+    base::u64 shearedNodes = 0;
 
     /// Logs one line for each kind that occurred.
     void report(const base::string& path) const;

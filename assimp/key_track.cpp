@@ -1,11 +1,12 @@
 #include "assimp/key_track.h"
 
+#include "assimp/quaternion.h"
+
 #include <algorithm>
 #include <cmath>
 
 namespace assimp {
 
-using base::i64;
 using base::quatf;
 using base::TimeCode;
 using base::vec3d;
@@ -44,31 +45,31 @@ quatf mix(const quatf& a, const quatf& b, double u) {
         wb = std::sin(wb * angle) / sine;
     }
     wb *= side;
-    const double x = a.x * wa + b.x * wb, y = a.y * wa + b.y * wb;
-    const double z = a.z * wa + b.z * wb, w = a.w * wa + b.w * wb;
-    const double f = 1 / std::sqrt(x * x + y * y + z * z + w * w);
-    return {static_cast<float>(x * f), static_cast<float>(y * f), static_cast<float>(z * f),
-            static_cast<float>(w * f)};
+    return normalized(
+        {a.x * wa + b.x * wb, a.y * wa + b.y * wb, a.z * wa + b.z * wb, a.w * wa + b.w * wb});
 }
 
 } // namespace
 
 template <class T>
-T valueAt(const KeyTrack<T>& track, TimeCode time) {
-    const TimeCode* first = track.times.cbegin();
-    const auto next =
-        static_cast<std::size_t>(std::upper_bound(first, track.times.cend(), time) - first);
-    if (next == 0 || next == track.times.size())
+T valueAt(const KeyTrack<T>& track, const Moment& moment) {
+    const TimeCode *first = track.times.cbegin(), *end = track.times.cend();
+    const TimeCode* key = moment.isAfter ? std::upper_bound(first, end, moment.time)
+                                         : std::lower_bound(first, end, moment.time);
+    const auto next = static_cast<std::size_t>(key - first);
+    if (next == 0 || key == end)
         return track.values[next == 0 ? 0 : next - 1];
-    const double span = static_cast<double>(first[next].ticks - first[next - 1].ticks);
-    const double u = static_cast<double>(time.ticks - first[next - 1].ticks) / span;
+    if (*key == moment.time)
+        return track.values[next];
+    const double span = static_cast<double>(key[0].ticks - key[-1].ticks);
+    const double u = static_cast<double>(moment.time.ticks - key[-1].ticks) / span;
     return mix(track.values[next - 1], track.values[next], u);
 }
 
-template vec3d valueAt(const KeyTrack<vec3d>&, TimeCode);
-template quatf valueAt(const KeyTrack<quatf>&, TimeCode);
-template vec3f valueAt(const KeyTrack<vec3f>&, TimeCode);
-template float valueAt(const KeyTrack<float>&, TimeCode);
+template vec3d valueAt(const KeyTrack<vec3d>&, const Moment&);
+template quatf valueAt(const KeyTrack<quatf>&, const Moment&);
+template vec3f valueAt(const KeyTrack<vec3f>&, const Moment&);
+template float valueAt(const KeyTrack<float>&, const Moment&);
 
 bool areAlike(const vec3d& a, const vec3d& b) {
     const double size = std::max(
@@ -93,20 +94,6 @@ bool areAlike(const vec3f& a, const vec3f& b) {
 
 bool areAlike(float a, float b) {
     return std::abs(a - b) <= weightSlack * std::max(std::abs(a), std::abs(b));
-}
-
-base::vector<TimeCode> listFrames(TimeCode first, TimeCode last, i64 frameTicks, bool& isTooLong) {
-    base::vector<TimeCode> times{first};
-    if ((last.ticks - first.ticks) / frameTicks >= maxFrames) {
-        isTooLong = true;
-    } else {
-        const i64 whole = first.ticks / frameTicks - (first.ticks % frameTicks < 0);
-        for (i64 t = (whole + 1) * frameTicks; t < last.ticks; t += frameTicks)
-            times.push_back({t});
-    }
-    if (first < last)
-        times.push_back(last);
-    return times;
 }
 
 } // namespace assimp

@@ -3,8 +3,6 @@
 #include "b_containers.h"
 #include "b_types.h"
 
-#include <span>
-
 namespace assimp {
 
 /// Values at ascending times, with straight lines, for rotations arcs, between them. Of equal times
@@ -13,14 +11,21 @@ template <class T>
 struct KeyTrack {
     base::vector<base::TimeCode> times;
     base::vector<T> values;
-    base::u8 before = 0, after = 0; ///< extrapolation codes of the framework
+    base::u8 preExtrapolation = 0, postExtrapolation = 0; ///< codes of the framework
 
     bool isEmpty() const { return values.empty(); }
 };
 
-/// The value at `time`, that of the nearest key outside the keys. The track has keys.
+/// A time. At a step, where keys share it, there are two: `isAfter` is false for the one before.
+struct Moment {
+    base::TimeCode time;
+    bool isAfter = true;
+    auto operator<=>(const Moment&) const = default;
+};
+
+/// The value at `moment`, that of the nearest key outside the keys. The track has keys.
 template <class T>
-T valueAt(const KeyTrack<T>& track, base::TimeCode time);
+T valueAt(const KeyTrack<T>& track, const Moment& moment);
 
 /// Differences that no one sees; the types are those of a node's translation, rotation and scale
 /// and of a morph target's weight.
@@ -43,21 +48,13 @@ bool isConstant(const KeyTrack<T>& track) {
     return track.isEmpty() || isConstant(track, track.values[0]);
 }
 
-/// Most frames for which keys are made on their own.
-constexpr base::i64 maxFrames = 100000;
-
-/// The times from `first` to `last`, both included, with every whole frame of `frameTicks` ticks
-/// between them. The ends alone if there are more than `maxFrames`, which sets `isTooLong`.
-base::vector<base::TimeCode> listFrames(base::TimeCode first, base::TimeCode last,
-                                        base::i64 frameTicks, bool& isTooLong);
-
 /// The track with the values of `track` at `times`.
 template <class T>
 KeyTrack<T> resample(const KeyTrack<T>& track, const base::vector<base::TimeCode>& times) {
-    KeyTrack<T> result{times, {}, track.before, track.after};
+    KeyTrack<T> result{times, {}, track.preExtrapolation, track.postExtrapolation};
     result.values.reserve(times.size());
     for (const base::TimeCode time : times)
-        result.values.push_back(valueAt(track, time));
+        result.values.push_back(valueAt(track, {time}));
     return result;
 }
 

@@ -19,6 +19,11 @@ TimeCode LayerMaker::startOf(std::size_t index) const {
     return index == 0 ? std::min(TimeCode{0}, clips_[0].first) : clips_[index].first;
 }
 
+/// No clip reaches into the next one, where it would show again behind that one's end.
+TimeCode LayerMaker::endOf(std::size_t index) const {
+    return index + 1 == clips_.size() ? clips_[index].end : clips_[index].last;
+}
+
 ref<IPlugin> LayerMaker::makeClip(std::size_t index) {
     const ClipTracks& source = clips_[index];
     ref<IPlugin> clip = factory_.create(animClip_schema::n_kind);
@@ -26,7 +31,7 @@ ref<IPlugin> LayerMaker::makeClip(std::size_t index) {
         write(*clip, animClip_schema::n_name) = source.name;
     write(*clip, animClip_schema::n_keyframeChannels) = std::move(channels_[index]);
     write(*clip, animClip_schema::n_startTime) = startOf(index);
-    write(*clip, animClip_schema::n_endTime) = source.last;
+    write(*clip, animClip_schema::n_endTime) = endOf(index);
     return clip;
 }
 
@@ -40,7 +45,7 @@ void LayerMaker::finish(IPlugin& scene, u32 framesPerSecond) {
         AttribMap& action = appendItem<Action>(*layer_, animLayer_schema::n_actions);
         write(action, Action::n_animClip) = makeClip(i);
         write(action, Action::n_playAt) = playAt;
-        end.ticks = playAt.ticks + clips_[i].last.ticks - startOf(i).ticks;
+        end.ticks = playAt.ticks + endOf(i).ticks - startOf(i).ticks;
         playAt.ticks = (end.ticks + 2 * frame - 1) / frame * frame;
     }
     write(*layer_, animLayer_schema::n_name) = "Animation";

@@ -18,8 +18,8 @@ base::ref<base::IPlugin> makeChannel(const base::string& name, const KeyTrack<T>
     base::AttribMap& curve = appendItem<Curve>(*channel, Schema::n_curves);
     write(curve, Curve::n_times) = track.times;
     curve.vecAttribute<T>(Curve::n_values) = track.values;
-    writeUnlessDefault(curve, Curve::n_preExtrapolation, track.before);
-    writeUnlessDefault(curve, Curve::n_postExtrapolation, track.after);
+    writeUnlessDefault(curve, Curve::n_preExtrapolation, track.preExtrapolation);
+    writeUnlessDefault(curve, Curve::n_postExtrapolation, track.postExtrapolation);
     return channel;
 }
 
@@ -30,16 +30,24 @@ public:
         : clips_(clips), channels_(clips.size()), factory_(factory) {}
 
     /// Links the attribute `name` of `owner` to a new output. `tracks` has an entry for each clip;
-    /// null: it holds `rest`.
+    /// null: it holds `rest`, in one object for all clips of the same range.
     template <class T>
     void animate(base::AttribMap& owner, base::name_id name, const base::string& label,
                  const base::vector<const KeyTrack<T>*>& tracks, const T& rest) {
         if (!layer_)
             layer_ = factory_.create(scene::animLayer_schema::n_kind);
         const auto output = static_cast<base::u32>(channels_[0].size());
-        for (std::size_t i = 0; i < clips_.size(); ++i)
-            channels_[i].push_back(
-                makeChannel(label, tracks[i] ? *tracks[i] : hold(clips_[i], rest), factory_));
+        base::map<std::pair<base::TimeCode, base::TimeCode>, base::ref<base::IPlugin>> held;
+        for (std::size_t i = 0; i < clips_.size(); ++i) {
+            if (tracks[i]) {
+                channels_[i].push_back(makeChannel(label, *tracks[i], factory_));
+                continue;
+            }
+            base::ref<base::IPlugin>& shared = held[{clips_[i].first, clips_[i].last}];
+            if (!shared)
+                shared = makeChannel(label, hold(clips_[i], rest), factory_);
+            channels_[i].push_back(shared);
+        }
         base::AttribPath path(*layer_, scene::animLayer_schema::n_outputs);
         owner.attribute(name, new base::AttribLink(path.element(output)));
     }
@@ -56,6 +64,7 @@ private:
         return {{clip.first, clip.last}, {rest, rest}};
     }
     base::TimeCode startOf(std::size_t index) const;
+    base::TimeCode endOf(std::size_t index) const;
     base::ref<base::IPlugin> makeClip(std::size_t index);
 
     const base::vector<ClipTracks>& clips_;

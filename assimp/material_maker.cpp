@@ -1,6 +1,7 @@
 #include "assimp/material_maker.h"
 
-#include "b_log.h"
+#include "assimp/fault_report.h"
+
 #include "b_string_convert.h"
 #include "b_vector_math.h"
 #include "stream/b_fs.h"
@@ -329,19 +330,18 @@ void MaterialMaker::writeOcclusion() {
 } // namespace
 
 void MaterialFaults::report(const string& path) const {
-    const auto tell = [&](int level, base::u64 count, const char* text) {
-        if (count != 0)
-            base::log().log(base::logScene, level, text, path, count);
-    };
-    tell(base::logWarning, nonFiniteValues,
-         "assimp |{}| Found {} material values that are no finite numbers, defaults are taken!");
-    tell(base::logInformation, opacityMaps,
-         "assimp |{}| Left out {} opacity maps that are not the color map as well.");
-    tell(base::logInformation, glossMaps, "assimp |{}| Left out {} gloss maps.");
-    tell(base::logInformation, metalWithoutMap,
-         "assimp |{}| Found {} metals without a map, which can't be told from other materials.");
-    tell(base::logInformation, transformedTextures,
-         "assimp |{}| Found {} textures with a transform or projection, which is left out.");
+    const FaultReport log(path);
+    log.warn(
+        nonFiniteValues,
+        "assimp |{}| Found {} material values that are no finite numbers, defaults are taken!");
+    log.inform(opacityMaps,
+               "assimp |{}| Left out {} opacity maps that are not the color map as well.");
+    log.inform(glossMaps, "assimp |{}| Left out {} gloss maps.");
+    log.inform(
+        metalWithoutMap,
+        "assimp |{}| Found {} metals without a map, which can't be told from other materials.");
+    log.inform(transformedTextures,
+               "assimp |{}| Found {} textures with a transform or projection, which is left out.");
 }
 
 void makeMaterial(const aiMaterial& source, const aiMesh& mesh, bool isMapped,

@@ -1,6 +1,9 @@
 #include "assimp/node_motion.h"
 
-#include "b_vector_math.h"
+#include "assimp/quaternion.h"
+
+#include "scene_schema.h"
+#include "scene_transform.h"
 
 #include <algorithm>
 #include <cmath>
@@ -11,6 +14,7 @@ namespace assimp {
 using base::mat43;
 using base::quatf;
 using base::TimeCode;
+using base::u64;
 using base::vec3d;
 using base::vec3f;
 using base::vector;
@@ -20,28 +24,17 @@ namespace {
 /// Difference between a column of a matrix and the same of its parts, as share of its length, that
 /// is no shear.
 constexpr float shearSlack = 1e-4f;
+/// The code of `rotateMode` for quaternions.
+constexpr base::u8 quaternionMode = 2;
 
-mat43 compose(const vec3d& translation, const quatf& q, const vec3f& s) {
-    const float x = q.x, y = q.y, z = q.z, w = q.w;
-    return {
-        {{(1 - 2 * (y * y + z * z)) * s.x, 2 * (x * y - z * w) * s.y, 2 * (x * z + y * w) * s.z},
-         {2 * (x * y + z * w) * s.x, (1 - 2 * (x * x + z * z)) * s.y, 2 * (y * z - x * w) * s.z},
-         {2 * (x * z - y * w) * s.x, 2 * (y * z + x * w) * s.y, (1 - 2 * (x * x + y * y)) * s.z}},
-        translation};
-}
-
-quatf product(const quatf& a, const quatf& b) {
-    return {a.w * b.x + a.x * b.w + a.y * b.z - a.z * b.y,
-            a.w * b.y - a.x * b.z + a.y * b.w + a.z * b.x,
-            a.w * b.z + a.x * b.y - a.y * b.x + a.z * b.w,
-            a.w * b.w - a.x * b.x - a.y * b.y - a.z * b.z};
-}
-
-quatf normalized(const quatf& q) {
-    const double length =
-        std::sqrt(double(q.x) * q.x + double(q.y) * q.y + double(q.z) * q.z + double(q.w) * q.w);
-    const auto share = [&](float v) { return static_cast<float>(v / length); };
-    return {share(q.x), share(q.y), share(q.z), share(q.w)};
+mat43 compose(const vec3d& translation, const quatf& rotation, const vec3f& scale) {
+    scene::TransformValues values;
+    values.rotateMode = quaternionMode;
+    values.translate = translation;
+    values.rotate = scene::widened(rotation);
+    values.scale = scene::widened(scale);
+    bool repaired = false;
+    return scene::composeTransform(values, repaired);
 }
 
 /// True if `matrix` has shear that its parts, composed to `composed`, have not.
@@ -60,13 +53,15 @@ bool isSheared(const mat43& matrix, const mat43& composed) {
     return false;
 }
 
-/// One factor with its parts.
+/// One factor with its parts at rest, as nodes store them: what has no keys goes with keys that are
+/// meant for them.
 class Factor {
 public:
     explicit Factor(const MotionFactor& source) : source_(source) {
-        const scene::TransformParts parts = scene::decomposeTransform(source.transform);
-        rotation_ = parts.rotation;
-        scale_ = parts.scale;
+        base::AttribMap node;
+        scene::storeTransform(node, source.transform);
+        rotation_ = read(node, scene::node_schema::n_rotate);
+        scale_ = read(node, scene::node_schema::n_scale);
         isPlain_ = source.motion || !isSheared(source.transform, compose({}, rotation_, scale_));
     }
 
@@ -76,20 +71,20 @@ public:
     }
     bool isPlain() const { return isPlain_; }
 
-    vec3d translationAt(TimeCode time) const {
+    vec3d translationAt(const Moment& moment) const {
         const auto& track = motion().translation;
-        return track.isEmpty() ? source_.transform.t : valueAt(track, time);
+        return track.isEmpty() ? source_.transform.t : valueAt(track, moment);
     }
-    quatf rotationAt(TimeCode time) const {
+    quatf rotationAt(const Moment& moment) const {
         const auto& track = motion().rotation;
-        return track.isEmpty() ? rotation_ : valueAt(track, time);
+        return track.isEmpty() ? rotation_ : valueAt(track, moment);
     }
-    vec3f scaleAt(TimeCode time) const {
+    vec3f scaleAt(const Moment& moment) const {
         const auto& track = motion().scale;
-        return track.isEmpty() ? scale_ : valueAt(track, time);
+        return track.isEmpty() ? scale_ : valueAt(track, moment);
     }
-    mat43 matrixAt(TimeCode time) const {
-        return source_.motion ? compose(translationAt(time), rotationAt(time), scaleAt(time))
+    mat43 matrixAt(const Moment& moment) const {
+        return source_.motion ? compose(translationAt(moment), rotationAt(moment), scaleAt(moment))
                               : source_.transform;
     }
 
@@ -125,16 +120,24 @@ bool isSeparable(const vector<Factor>& factors) {
     return true;
 }
 
-void makeUnique(vector<TimeCode>& times) {
-    std::ranges::sort(times);
-    times.resize(static_cast<std::size_t>(std::ranges::unique(times).begin() - times.begin()));
+void makeUnique(vector<Moment>& moments) {
+    std::ranges::sort(moments);
+    moments.resize(
+        static_cast<std::size_t>(std::ranges::unique(moments).begin() - moments.begin()));
+}
+
+template <class T>
+void appendMoments(const KeyTrack<T>& track, vector<Moment>& moments) {
+    for (std::size_t i = 0; i < track.times.size(); ++i) {
+        const bool isStep = i + 1 < track.times.size() && track.times[i] == track.times[i + 1];
+        moments.push_back({track.times[i], !isStep});
+    }
 }
 
 class Composer {
 public:
-    Composer(const vector<MotionFactor>& factors, const MotionSampling& sampling,
-             MotionFaults& faults)
-        : sampling_(sampling), faults_(faults) {
+    Composer(const vector<MotionFactor>& factors, FrameSampler& frames, u64& shearedNodes)
+        : frames_(frames), shearedNodes_(shearedNodes) {
         for (const MotionFactor& factor : factors)
             factors_.emplace_back(factor);
     }
@@ -143,39 +146,53 @@ public:
         if (std::as_const(factors_).size() != 1 && !isSeparable(factors_))
             return sampleProduct();
         NodeMotion result;
-        compose(&NodeMotion::translation, result, [&](TimeCode t) { return productAt(t).t; });
-        compose(&NodeMotion::rotation, result, [&](TimeCode t) { return rotationAt(t); });
-        compose(&NodeMotion::scale, result, [&](TimeCode t) { return scaleAt(t); });
+        compose(&NodeMotion::translation, result, [&](const Moment& m) { return productAt(m).t; });
+        compose(&NodeMotion::rotation, result, [&](const Moment& m) { return rotationAt(m); });
+        compose(&NodeMotion::scale, result, [&](const Moment& m) { return scaleAt(m); });
         return result;
     }
 
 private:
-    /// The times of all keys of moving tracks.
+    /// Those of one kind that change.
     template <class T>
-    vector<TimeCode> findTimes(KeyTrack<T> NodeMotion::*track) const {
-        vector<TimeCode> times;
+    vector<const KeyTrack<T>*> findMoving(KeyTrack<T> NodeMotion::*track) const {
+        vector<const KeyTrack<T>*> moving;
         for (const Factor& factor : factors_)
             if (const KeyTrack<T>& own = factor.motion().*track; !isConstant(own))
-                times.append(own.times.cbegin(), own.times.cend());
-        makeUnique(times);
-        return times;
+                moving.push_back(&own);
+        return moving;
     }
-    /// The time of some key, for what does not move.
-    TimeCode anyTime() const {
+    /// The moments of all keys of moving tracks.
+    template <class T>
+    vector<Moment> findMoments(KeyTrack<T> NodeMotion::*track) const {
+        vector<Moment> moments;
+        for (const KeyTrack<T>* moving : findMoving(track))
+            appendMoments(*moving, moments);
+        makeUnique(moments);
+        return moments;
+    }
+    /// That of some key, for what does not move.
+    Moment anyMoment() const {
         for (const Factor& factor : factors_) {
             const NodeMotion& motion = factor.motion();
             for (const auto* times :
                  {&motion.translation.times, &motion.rotation.times, &motion.scale.times})
                 if (!times->empty())
-                    return times->front();
+                    return {times->front()};
         }
         return {};
     }
-    vector<TimeCode> listFrames(TimeCode first, TimeCode last) {
-        bool isTooLong = false;
-        vector<TimeCode> frames = assimp::listFrames(first, last, sampling_.frameTicks, isTooLong);
-        faults_.longMotions += isTooLong;
-        return frames;
+    /// Adds frames to `moments` for `trackCount` tracks, or puts them in their place.
+    void addFrames(vector<Moment>& moments, base::i64 trackCount) {
+        const TimeCode first = moments.front().time, last = moments.back().time;
+        if (first == last)
+            return;
+        const vector<TimeCode> frames = frames_.listFrames(first, last, trackCount);
+        if (frames_.everyFrame() && !frames.empty())
+            moments.clear();
+        for (const TimeCode time : frames)
+            moments.push_back({time});
+        makeUnique(moments);
     }
 
     /// Fills one track of the product of factors that are separable.
@@ -183,35 +200,42 @@ private:
     void compose(KeyTrack<T> NodeMotion::*track, NodeMotion& result, const ValueAt& valueOf) {
         const KeyTrack<T>& own = std::as_const(factors_)[0].motion().*track;
         KeyTrack<T>& to = result.*track;
-        if (std::as_const(factors_).size() == 1 && (!sampling_.everyFrame || isConstant(own))) {
+        if (std::as_const(factors_).size() == 1 && (!frames_.everyFrame() || isConstant(own))) {
             to = own;
             return;
         }
-        to.times = findTimes(track);
-        if (std::as_const(to.times).empty())
-            to.times.push_back(anyTime());
-        if (sampling_.everyFrame && to.times.size() > 1)
-            to.times = listFrames(to.times.front(), to.times.back());
-        for (const TimeCode time : std::as_const(to.times))
-            to.values.push_back(valueOf(time));
+        vector<Moment> moments = findMoments(track);
+        if (std::as_const(moments).empty())
+            moments.push_back(anyMoment());
+        if (frames_.everyFrame())
+            addFrames(moments, 1);
+        for (const Moment& moment : std::as_const(moments)) {
+            to.times.push_back(moment.time);
+            to.values.push_back(valueOf(moment));
+        }
+        // Beyond the keys too, the product does what the only factor that moves does.
+        if (const auto moving = findMoving(track); moving.size() == 1) {
+            to.preExtrapolation = moving[0]->preExtrapolation;
+            to.postExtrapolation = moving[0]->postExtrapolation;
+        }
     }
 
-    mat43 productAt(TimeCode time) const {
-        mat43 matrix = factors_[0].matrixAt(time);
+    mat43 productAt(const Moment& moment) const {
+        mat43 matrix = factors_[0].matrixAt(moment);
         for (std::size_t i = 1; i < factors_.size(); ++i)
-            matrix = scene::multiply(matrix, factors_[i].matrixAt(time));
+            matrix = scene::multiply(matrix, factors_[i].matrixAt(moment));
         return matrix;
     }
-    quatf rotationAt(TimeCode time) const {
-        quatf rotation = factors_[0].rotationAt(time);
+    quatf rotationAt(const Moment& moment) const {
+        quatf rotation = factors_[0].rotationAt(moment);
         for (std::size_t i = 1; i < factors_.size(); ++i)
-            rotation = normalized(product(rotation, factors_[i].rotationAt(time)));
+            rotation = product(rotation, factors_[i].rotationAt(moment));
         return rotation;
     }
-    vec3f scaleAt(TimeCode time) const {
+    vec3f scaleAt(const Moment& moment) const {
         vec3f scale{1, 1, 1};
         for (const Factor& factor : factors_) {
-            const vec3f s = factor.scaleAt(time);
+            const vec3f s = factor.scaleAt(moment);
             scale = {scale.x * s.x, scale.y * s.y, scale.z * s.z};
         }
         return scale;
@@ -219,46 +243,41 @@ private:
 
     /// Takes the product apart at all times of keys and on every frame.
     NodeMotion sampleProduct() {
-        vector<TimeCode> times = findTimes(&NodeMotion::translation);
-        for (const vector<TimeCode>& others :
-             {findTimes(&NodeMotion::rotation), findTimes(&NodeMotion::scale)})
-            times.append(others.cbegin(), others.cend());
-        makeUnique(times);
-        if (std::as_const(times).empty())
-            times.push_back(anyTime());
-        if (std::as_const(times).size() > 1) {
-            const vector<TimeCode> frames = listFrames(times.front(), times.back());
-            if (sampling_.everyFrame && frames.size() > 2)
-                times.clear();
-            times.append(frames.cbegin(), frames.cend());
-            makeUnique(times);
-        }
+        vector<Moment> moments = findMoments(&NodeMotion::translation);
+        for (const vector<Moment>& others :
+             {findMoments(&NodeMotion::rotation), findMoments(&NodeMotion::scale)})
+            moments.append(others.cbegin(), others.cend());
+        makeUnique(moments);
+        if (std::as_const(moments).empty())
+            moments.push_back(anyMoment());
+        addFrames(moments, 3);
         NodeMotion result;
         bool isSomewhereSheared = false;
-        for (const TimeCode time : std::as_const(times)) {
-            const mat43 matrix = productAt(time);
+        for (const Moment& moment : std::as_const(moments)) {
+            const mat43 matrix = productAt(moment);
             const scene::TransformParts parts = scene::decomposeTransform(matrix);
             isSomewhereSheared |=
                 isSheared(matrix, assimp::compose({}, parts.rotation, parts.scale));
+            result.translation.times.push_back(moment.time);
             result.translation.values.push_back(matrix.t);
             result.rotation.values.push_back(parts.rotation);
             result.scale.values.push_back(parts.scale);
         }
-        faults_.shearedNodes += isSomewhereSheared;
-        result.translation.times = result.rotation.times = result.scale.times = times;
+        shearedNodes_ += isSomewhereSheared;
+        result.rotation.times = result.scale.times = result.translation.times;
         return result;
     }
 
     vector<Factor> factors_;
-    const MotionSampling& sampling_;
-    MotionFaults& faults_;
+    FrameSampler& frames_;
+    u64& shearedNodes_;
 };
 
 } // namespace
 
-NodeMotion composeMotion(const vector<MotionFactor>& factors, const MotionSampling& sampling,
-                         MotionFaults& faults) {
-    return Composer(factors, sampling, faults).run();
+NodeMotion composeMotion(const vector<MotionFactor>& factors, FrameSampler& frames,
+                         u64& shearedNodes) {
+    return Composer(factors, frames, shearedNodes).run();
 }
 
 } // namespace assimp

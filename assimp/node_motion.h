@@ -1,8 +1,7 @@
 #pragma once
 
+#include "assimp/frame_sampler.h"
 #include "assimp/key_track.h"
-
-#include "scene_transform.h"
 
 namespace assimp {
 
@@ -21,25 +20,14 @@ struct MotionFactor {
     const NodeMotion* motion = nullptr; ///< what takes its place, null for none
 };
 
-/// How motions are sampled.
-struct MotionSampling {
-    base::i64 frameTicks;
-    bool everyFrame = false; ///< keys on every frame in place of the file's
-};
-
-/// What could not be kept, counted for one report.
-struct MotionFaults {
-    base::u64 longMotions = 0;
-    base::u64 shearedNodes = 0;
-};
-
 /// The motion of a node whose transform is the product of `factors`, the outermost first.
 ///
 /// A single factor keeps its keys. Of several, each of translation, rotation and scale keeps the
 /// times of its own keys if it is a straight line or arc between them still. Where it is not, as
 /// with a pivot behind a rotation, all three get keys at all times and on every frame between.
-/// Shear is lost.
-NodeMotion composeMotion(const base::vector<MotionFactor>& factors, const MotionSampling& sampling,
-                         MotionFaults& faults);
+/// Shear is lost, which adds 1 to `shearedNodes`. Where several keys at one time make a step, so do
+/// two of the result.
+NodeMotion composeMotion(const base::vector<MotionFactor>& factors, FrameSampler& frames,
+                         base::u64& shearedNodes);
 
 } // namespace assimp

@@ -8,6 +8,41 @@
 
 namespace assimp {
 
+namespace {
+
+/// A part of the names that the library gives to its helpers.
+constexpr base::string_view helperMark = "_$AssimpFbx$_";
+
+} // namespace
+
+NodeTable::NodeTable(const aiNode& root, bool hasHelpers) : root_(root) {
+    if (hasHelpers)
+        findFactors();
+}
+
+/// Not by recursion: files may nest nodes very deep. A helper behind too many others is a node, so
+/// no chain of transforms costs much.
+void NodeTable::findFactors() {
+    constexpr int mostFactors = 32;
+    struct Pending {
+        const aiNode* node;
+        int factorsAbove;
+    };
+    base::vector<Pending> pending{{&root_, 0}};
+    while (!pending.empty()) {
+        const auto [node, factorsAbove] = std::as_const(pending).back();
+        pending.pop_back();
+        const bool isFactor = node != &root_ && node->mNumChildren != 0 && node->mNumMeshes == 0 &&
+                              factorsAbove < mostFactors &&
+                              viewOf(node->mName).find(helperMark) != base::string_view::npos;
+        for (base::u32 i = 0; i < node->mNumChildren; ++i) {
+            pending.push_back({node->mChildren[i], isFactor ? factorsAbove + 1 : 0});
+            if (isFactor)
+                factors_.emplace(node->mChildren[i], node);
+        }
+    }
+}
+
 const aiNode* NodeTable::find(base::string_view name) {
     if (byName_.empty())
         gatherNames();
@@ -50,8 +85,8 @@ base::IPlugin* NodeTable::objectOf(const aiNode& source) const {
     return found == objects_.end() ? nullptr : found->second;
 }
 
-void NodeTable::addFactorAbove(const aiNode& node, const aiNode& factor) {
-    factors_.emplace(&node, &factor);
+bool NodeTable::isFactor(const aiNode& node) const {
+    return node.mNumChildren != 0 && factorAbove(*node.mChildren[0]) == &node;
 }
 
 const aiNode* NodeTable::factorAbove(const aiNode& node) const {

@@ -1,6 +1,6 @@
 #include "assimp/vertex_joints.h"
 
-#include "b_log.h"
+#include "assimp/fault_report.h"
 
 #include <assimp/mesh.h>
 
@@ -14,22 +14,20 @@ using base::u64;
 using base::vector;
 
 void SkeletonFaults::report(const base::string& path) const {
-    const auto tell = [&](int level, u64 count, const char* text) {
-        if (count != 0)
-            base::log().log(base::logScene, level, text, path, count);
-    };
-    tell(base::logWarning, missingBones,
-         "assimp |{}| Left out {} bones without a node of their name!");
-    tell(base::logWarning, brokenBindPoses,
-         "assimp |{}| Found {} bind poses that are not finite, the identity is taken!");
-    tell(base::logWarning, brokenWeights,
-         "assimp |{}| Left out {} weights of bones that are no positive numbers or belong to no "
-         "vertex!");
-    tell(base::logInformation, freeVertices,
-         "assimp |{}| Found {} vertices that no bone moves, they go with their node.");
-    tell(base::logWarning, targetsOfSkins,
-         "assimp |{}| Left out {} morph targets of meshes that have a skeleton too, as exporters "
-         "draw a mesh with either of them!");
+    const FaultReport log(path);
+    log.warn(missingBones, "assimp |{}| Left out {} bones without a node of their name!");
+    log.warn(brokenBindPoses,
+             "assimp |{}| Found {} bind poses that are not finite, the identity is taken!");
+    log.warn(
+        brokenWeights,
+        "assimp |{}| Left out {} weights of bones that are no positive numbers or belong to no "
+        "vertex!");
+    log.inform(freeVertices,
+               "assimp |{}| Found {} vertices that no bone moves, they go with their node.");
+    log.warn(
+        targetsOfSkins,
+        "assimp |{}| Left out {} morph targets of meshes that have a skeleton too, as exporters "
+        "draw a mesh with either of them!");
 }
 
 namespace {
@@ -93,7 +91,9 @@ std::size_t settle(std::span<Influence> influences) {
             influences[count++] = influence;
     }
     const std::span used = influences.first(count);
-    std::ranges::stable_sort(used, std::ranges::greater(), &Influence::weight);
+    std::ranges::sort(used, [](const Influence& a, const Influence& b) {
+        return a.weight != b.weight ? a.weight > b.weight : a.joint < b.joint;
+    });
     constexpr std::size_t mostInfluences = 0xffff;
     count = std::min(count, mostInfluences);
     double sum = 0;

@@ -3,7 +3,6 @@
 #include "assimp/import_geometry.h"
 #include "assimp/library_text.h"
 
-#include "b_log.h"
 #include "b_vector_math.h"
 
 #include <assimp/mesh.h>

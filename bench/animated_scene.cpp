@@ -66,6 +66,7 @@ AnimatedScene::AnimatedScene(u32 nodeCount, u32 frames) : scene(makeScene()), fr
     for (u32 i = 0; i < nodeCount; ++i) {
         const float phase = 0.01f * static_cast<float>(i);
         auto& node = scene->addTo<scene::INode>(*scene->root, "moving");
+        nodes.push_back(&node);
         test_support::makeTriangle(scene->addTo<scene::IMesh>(node, "triangle"));
         translations.push_back(&addChannel<base::vec3d>(*scene, frameCount, phase));
         scales.push_back(&addChannel<base::vec3f>(*scene, frameCount, phase));
@@ -80,10 +81,14 @@ AnimatedScene::AnimatedScene(u32 nodeCount, u32 frames) : scene(makeScene()), fr
     write(*scene->scene, scene::scene_schema::n_animLayers).push_back(scene::Object(&layer));
 }
 
+TimeCode frameTime(u32 frame) {
+    return {frame * ticksPerFrame};
+}
+
 double evaluateAll(const AnimatedScene& animated) {
     double sum = 0;
     for (u32 frame = 0; frame < animated.frameCount; ++frame) {
-        const TimeCode time{frame * ticksPerFrame};
+        const TimeCode time = frameTime(frame);
         for (std::size_t i = 0; i < animated.translations.size(); ++i) {
             sum += scene::computeValue<base::vec3d>(*animated.translations[i], time).x;
             sum += scene::computeValue<base::vec3f>(*animated.scales[i], time).x;

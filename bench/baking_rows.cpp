@@ -1,6 +1,8 @@
 #include "animated_scene.h"
 #include "measure.h"
 
+#include "gltf/exporter.h"
+#include "gltf/scene_clock.h"
 #include "support/gltf_reader.h"
 
 #include <filesystem>
@@ -28,17 +30,60 @@ double exportSeconds(const AnimatedScene& animated, const OutputFolder& folder) 
     return seconds;
 }
 
+double evaluationSeconds(const AnimatedScene& animated) {
+    return secondsOf([&] { benchmark::DoNotOptimize(evaluateAll(animated)); });
+}
+
+/// What the exporter samples of a node.
+gltf::NodeAnimation makeEntry(const scene::INode& node) {
+    using Channel = GLTF::Animation::Channel;
+    gltf::NodeAnimation entry;
+    entry.node = &node;
+    entry.end = frameTime(frameCount);
+    entry.paths = 1u << Channel::translation | 1u << Channel::scale | 1u << Channel::rotation;
+    entry.sampler = gltf::NodeSampler(node, {});
+    entry.translations.reserve(frameCount);
+    entry.scales.reserve(frameCount);
+    entry.rotations.reserve(frameCount);
+    return entry;
+}
+
+/// The samples alone: layers told of each frame, transforms composed and taken apart.
+void sample(benchmark::State& state) {
+    const AnimatedScene animated(nodeCount, frameCount);
+    const auto exporter = base::makeRef<gltf::GLTFScenePlugin>(base::ref<base::IPluginDesc>(),
+                                                               animated.scene->factory.get(), 0);
+    for (auto _ : state) {
+        gltf::SceneClock clock(*animated.scene->scene);
+        clock.tellLayers();
+        base::vector<gltf::NodeAnimation> entries;
+        for (const scene::INode* node : animated.nodes)
+            entries.push_back(makeEntry(*node));
+        const double seconds = secondsOf([&] {
+            for (base::u32 frame = 0; frame < frameCount; ++frame) {
+                clock.set(frameTime(frame));
+                for (gltf::NodeAnimation& entry : entries)
+                    exporter->sampleNodeAnimation(entry, frameTime(frame));
+            }
+        });
+        for (const gltf::NodeAnimation& entry : std::as_const(entries))
+            if (entry.rotations.size() != frameCount)
+                throw std::runtime_error("there are samples missing");
+        reportTimes(state, seconds, evaluationSeconds(animated));
+    }
+}
+
+/// The whole export with its file.
 void bake(benchmark::State& state) {
     const OutputFolder folder;
     const AnimatedScene animated(nodeCount, frameCount);
     for (auto _ : state) {
         const double seconds = exportSeconds(animated, folder);
-        reportTimes(state, seconds,
-                    secondsOf([&] { benchmark::DoNotOptimize(evaluateAll(animated)); }));
+        reportTimes(state, seconds, evaluationSeconds(animated));
     }
 }
 
-/// How the time grows: with `nodes` and `frames` against the same of `bake`.
+/// How the time of an export grows with `nodes` and `frames`.
 void compareSizes(benchmark::State& state, base::u32 nodes, base::u32 frames) {
     const OutputFolder folder;
     const AnimatedScene few(nodeCount, frameCount), many(nodes, frames);
@@ -56,9 +101,10 @@ void bakeFrames(benchmark::State& state) {
     compareSizes(state, nodeCount, 4 * frameCount);
 }
 
-BENCH_ROW(bake, "animation/bake");
-BENCH_ROW(bakeNodes, "animation/bake-nodes");
-BENCH_ROW(bakeFrames, "animation/bake-frames");
+BENCH_ROW(sample, "animation/bake");
+BENCH_ROW(bake, "animation/export");
+BENCH_ROW(bakeNodes, "animation/nodes");
+BENCH_ROW(bakeFrames, "animation/frames");
 
 } // namespace
 

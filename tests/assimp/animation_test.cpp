@@ -2,6 +2,7 @@
 #include "file_builder.h"
 #include "pose_model.h"
 
+#include "assimp/frame_sampler.h"
 #include "scene.h"
 
 #include <assimp/Importer.hpp>
@@ -31,15 +32,20 @@ protected:
         return *document_->plugin(static_cast<u32>(document_->findByName(name)));
     }
     /// The times of a channel's keys in seconds.
-    vector<double> times(const char* channel) {
+    vector<double> times(const base::IPlugin& channel) {
         vector<double> seconds;
-        for (const auto* object : objects(keyframeChannel_schema::n_kind))
-            if (object->getName() == channel && seconds.empty())
-                for (const TimeCode t :
-                     valuesOf(*find(*object, keyframeChannel_schema::n_curves)->item(0)->asMap(),
-                              keyframeChannelCurve_schema::n_times))
-                    seconds.push_back(t.seconds());
+        for (const TimeCode t :
+             valuesOf(*find(channel, keyframeChannel_schema::n_curves)->item(0)->asMap(),
+                      keyframeChannelCurve_schema::n_times))
+            seconds.push_back(t.seconds());
         return seconds;
+    }
+    /// Those of the first channel with the name.
+    vector<double> times(const char* channel) {
+        for (const auto* object : objects(keyframeChannel_schema::n_kind))
+            if (object->getName() == channel)
+                return times(*object);
+        return {};
     }
     double second(const base::IPlugin& object, const SchemaAttribute<TimeCode>& attribute) {
         const TimeCode* time = find(object, attribute);
@@ -126,6 +132,22 @@ TEST_F(Animation, ClipsFollowEachOther) {
     importFile(again);
     EXPECT_EQ(objects(animClip_schema::n_kind).size(), 1u);
     EXPECT_EQ(channels(), "a.translate ");
+}
+
+TEST_F(Animation, LengthsThatFilesTellStretchNoClip) {
+    FileBuilder file;
+    for (const char* name : {"a", "b"}) {
+        file.node(name, file.root());
+        file.channel(file.animation(30, 2.9e7), name, {.positions = {{0, {}}, {30, {1, 0, 0}}}});
+    }
+    base::IPlugin& scene = importFile(file);
+    // A clip holds what the other moves as long as its own keys last; a frame later comes the
+    // other.
+    for (const auto* channel : objects(keyframeChannel_schema::n_kind))
+        EXPECT_EQ(times(*channel), (vector<double>{0, 1})) << channel->getName();
+    poseScene(scene, 31 / 30.0 + 0.5);
+    EXPECT_EQ(read(nodeCalled("b"), node_schema::n_translate), (vec3d{0.5, 0, 0}));
+    EXPECT_NEAR(second(scene, scene_schema::n_endTime), 31 / 30.0 + 2.9e7 / 30, 1e-6);
 }
 
 TEST_F(Animation, RatesComeFromTicksOrKeys) {
@@ -254,6 +276,69 @@ TEST_F(Animation, ChainsOfHelpersBecomeOneNode) {
     }
 }
 
+TEST_F(Animation, HelpersAreThoseOfFbxAndShortChains) {
+    const struct {
+        const char* file;
+        std::size_t nodes;
+    } cases[] = {{"deep.fbx", 3}, {"deep.dae", 42}};
+    for (const auto& c : cases) {
+        FileBuilder original, imported;
+        for (FileBuilder* file : {&original, &imported}) {
+            aiNode* last = &file->root();
+            for (int i = 0; i < 40; ++i)
+                last = &file->node("n_$AssimpFbx$_Scaling" + std::to_string(i), *last,
+                                   translated(1, 0, 0) * matrixOf(turned(20, {0, 1, 0})));
+            file->mesh(file->node("n", *last), triangle);
+        }
+        base::IPlugin& scene = importFile(imported, c.file);
+        EXPECT_EQ(objects(node_schema::n_kind).size(), c.nodes) << c.file;
+        EXPECT_LT(poseDifference(poseFile(*original.scene, 0, 0), poseScene(scene, 0)), 1e-5);
+    }
+}
+
+TEST_F(Animation, StepsInChainsStaySteps) {
+    // With a rotation that moves, the offset behind it is sampled on frames; else keys are kept.
+    for (const bool turns : {false, true}) {
+        SCOPED_TRACE(turns);
+        FileBuilder original, imported;
+        for (FileBuilder* file : {&original, &imported}) {
+            aiNode& turn = file->node("n_$AssimpFbx$_Rotation", file->root());
+            file->mesh(file->node("n", turn, translated(0, 3, 0)), triangle);
+            aiAnimation& walk = file->animation(24, 0);
+            if (turns)
+                file->channel(walk, "n_$AssimpFbx$_Rotation",
+                              {.rotations = {{0, {}}, {24, turned(90, {0, 0, 1})}}});
+            file->channel(
+                walk, "n",
+                {.positions = {{0, {0, 3, 0}}, {12.5, {1, 3, 0}}, {12.5, {9, 0, 0}}, {24, {}}}});
+        }
+        base::IPlugin& scene = importFile(imported, "chain.fbx");
+        for (const double frame : {0.0, 11.0, 12.4999, 12.5, 24.0})
+            EXPECT_LT(poseDifference(poseFile(*original.scene, 0, frame / 24),
+                                     poseScene(scene, frame / 24)),
+                      turns ? 2e-4 : 2e-6)
+                << frame;
+    }
+}
+
+TEST_F(Animation, CyclesGoOn) {
+    for (const bool isChain : {false, true}) {
+        set(Settings::n_importBakedAnimations, !isChain);
+        FileBuilder file;
+        aiNode& above = isChain ? file.node("n_$AssimpFbx$_PreRotation", file.root(),
+                                            matrixOf(turned(90, {0, 0, 1})))
+                                : file.root();
+        file.node("n", above);
+        aiNodeAnim& channel = FileBuilder::channel(file.animation(24, 240), "n",
+                                                   {.positions = {{0, {}}, {24, {4, 0, 0}}}});
+        channel.mPostState = aiAnimBehaviour_REPEAT;
+        base::IPlugin& scene = importFile(file, "cycle.fbx");
+        poseScene(scene, 2.25);
+        const vec3d found = read(nodeCalled("n"), node_schema::n_translate);
+        EXPECT_NEAR(isChain ? found.y : found.x, 1, 1e-6);
+    }
+}
+
 TEST_F(Animation, HeldFactorsMoveWhatIsBehindThem) {
     FileBuilder original, imported;
     for (FileBuilder* file : {&original, &imported}) {
@@ -282,21 +367,65 @@ TEST_F(Animation, BakedCurvesHaveAKeyOnEveryFrame) {
     ASSERT_EQ(found.size(), wanted.size());
     for (std::size_t i = 0; i < wanted.size(); ++i)
         EXPECT_NEAR(found[i], wanted[i], 1e-9);
-    EXPECT_EQ(times("up.weight").size(), 3u);
+    ASSERT_EQ(times("up.weight").size(), 3u);
     expectPoses(*original.scene, scene, 0, 0, 3 / 24.0, 0);
 }
 
 TEST_F(Animation, VeryLongMotionsKeepTheirKeys) {
     set(Settings::n_importBakedAnimations, true);
     FileBuilder file;
-    file.node("a", file.root());
-    file.channel(file.animation(24, 0), "a", {.positions = {{0, {}}, {2.3e7, {1, 2, 3}}}});
+    aiMesh& mesh = file.mesh(file.node("a", file.root()), triangle);
+    file.target(mesh, "up", 0, triangle);
+    aiAnimation& walk = file.animation(24, 0);
+    file.channel(walk, "a", {.positions = {{0, {}}, {24, {9, 9, 9}}, {2.3e7, {1, 2, 3}}}});
+    file.weights(walk, "a", {{0, {0}}, {48, {1}}, {2.3e7, {0}}});
     LogCapture log;
     importFile(file);
     EXPECT_TRUE(log.has(base::logWarning,
                         "assimp |" + path() +
-                            "| Found 1 motions that are too long for keys on every frame!"));
-    EXPECT_EQ(times("a.translate").size(), 2u);
+                            "| Found 2 motions that are too long for keys on every frame!"));
+    ASSERT_EQ(times("a.translate").size(), 3u);
+    EXPECT_EQ(times("a.translate")[1], 1);
+    ASSERT_EQ(times("up.weight").size(), 3u);
+    EXPECT_EQ(times("up.weight")[1], 2);
+}
+
+TEST(FrameSampler, KeysOfAllTracksHaveALimit) {
+    assimp::FrameSampler frames(10, true);
+    int count = 0;
+    while (count < 50 && frames.listFrames({0}, {999'980}, 3).size() == 99'999)
+        ++count;
+    EXPECT_EQ(count, 33); // the next would come to 10,199,898 keys
+    EXPECT_EQ(frames.longMotions(), 1u);
+    EXPECT_EQ(frames.listFrames({0}, {15}, 3).size(), 3u);
+}
+
+TEST_F(Animation, MirroredNodesKeepTheirSideWhereKeysAreMissing) {
+    const aiMatrix4x4 mirror(-1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1);
+    const aiQuaternion turn = turned(40, {0, 0, 1});
+    const FileBuilder::Keys rotations{.rotations = {{0, turn}, {24, turned(-30, {1, 0, 0})}}};
+    const FileBuilder::Keys scales{.scales = {{0, {-1, 1, 1}}, {24, {-2, 3, 1}}}};
+    for (const bool turns : {true, false})
+        for (const std::string name : {"n", "n_$AssimpFbx$_Scaling"}) {
+            SCOPED_TRACE(name + (turns ? " turns" : " grows"));
+            FileBuilder original, imported;
+            for (FileBuilder* file : {&original, &imported}) {
+                aiNode& node = file->node(name, file->root(), matrixOf(turn) * mirror);
+                file->mesh(name == "n" ? node : file->node("n", node), triangle);
+                // The library has no rest beside keys: there, the other kind stands still.
+                FileBuilder::Keys keys = turns ? rotations : scales;
+                if (file == &original && turns)
+                    keys.scales = {{0, {-1, 1, 1}}};
+                else if (file == &original)
+                    keys.rotations = {{0, turn}};
+                file->channel(file->animation(24, 0), name, keys);
+            }
+            base::IPlugin& scene = importFile(imported, "mirror.fbx");
+            for (const double t : {0.0, 0.3, 1.0})
+                EXPECT_LT(poseDifference(poseFile(*original.scene, 0, t), poseScene(scene, t)),
+                          2e-6)
+                    << t;
+        }
 }
 
 TEST_F(Animation, FilesWithPivotsMoveAsTheLibraryTells) {

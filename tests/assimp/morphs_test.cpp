@@ -144,6 +144,7 @@ TEST_F(Morphs, OfSkinnedMeshesAreLeftOut) {
     aiMesh& source = file.mesh(file.root(), square);
     file.target(source, "a", 0, lifted);
     file.bone(source, "bone", {}, {{0, 1}});
+    file.weights(file.animation(24, 0), "root*0", {{0, {0}}, {1, {1}}}); // goes with them
     aiAnimMesh& odd = file.target(file.mesh(file.root(), square), "odd", 0, lifted);
     odd.mNumVertices = 5;
     LogCapture log;

@@ -61,7 +61,8 @@ Matrix transformAt(const aiNodeAnim& channel, double ticks, const aiNode& node) 
         r = sample(channel.mRotationKeys, channel.mNumRotationKeys, ticks, mixTurns);
     if (channel.mNumScalingKeys)
         s = sample(channel.mScalingKeys, channel.mNumScalingKeys, ticks, mixPoints);
-    return Matrix(s, r, t);
+    // The library's constructor from these three scales last.
+    return Matrix({1, 1, 1}, r, t) * Matrix(s, {}, {});
 }
 
 class FilePose {
