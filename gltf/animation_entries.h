@@ -14,10 +14,11 @@ struct NodeAnimation {
     base::ref<GLTF::Animation> animation;
     base::TimeCode start, end; ///< first and last key
     base::u32 paths = 0;       ///< bit n is set if there is a channel of path n
-    // One per sample, empty for a property without a channel.
-    base::vector<base::vec3f> translations;
-    base::vector<base::quatf> rotations;
-    base::vector<base::vec3f> scales;
+    // Borrowed room for the samples; none for a property without a channel.
+    base::vec3f* translations = nullptr;
+    base::quatf* rotations = nullptr;
+    base::vec3f* scales = nullptr;
+    std::size_t sampleCount = 0; ///< samples taken so far
     NodeSampler sampler;
 };
 

@@ -2,6 +2,7 @@
 #include "gltf/scene_clock.h"
 
 #include "b_log.h"
+#include "b_pages.h"
 #include "scene_schema.h"
 
 #include <algorithm>
@@ -153,16 +154,49 @@ ref<GLTF::Accessor> takeSamples(Type type, vector<T>& samples) {
     return accessor;
 }
 
-void reserveSamples(NodeAnimation& entry, std::size_t count) {
-    if ((entry.paths & 1u << Channel::translation) != 0)
-        entry.translations.reserve(count);
-    if ((entry.paths & 1u << Channel::scale) != 0)
-        entry.scales.reserve(count);
-    if ((entry.paths & 1u << Channel::rotation) != 0)
-        entry.rotations.reserve(count);
+/// Room for the samples of all nodes, in one block: in blocks of their own those of each frame
+/// would lie on as many pages of memory as there are channels.
+class SampleRoom {
+public:
+    explicit SampleRoom(base::u64 byteLength) {
+        floats_.resizeUninitialized(byteLength / sizeof(float));
+        base::askForLargePages(floats_.data(), floats_.byteLength());
+    }
+    void give(NodeAnimation& entry, std::size_t count) {
+        give(entry.translations, entry, Channel::translation, count);
+        give(entry.scales, entry, Channel::scale, count);
+        give(entry.rotations, entry, Channel::rotation, count);
+    }
+    vector<float> take() { return std::move(floats_); }
+
+private:
+    template <class T>
+    void give(T*& samples, const NodeAnimation& entry, Channel::Path path, std::size_t count) {
+        if ((entry.paths & 1u << path) == 0)
+            return;
+        samples = reinterpret_cast<T*>(floats_.data() + used_);
+        used_ += count * sizeof(T) / sizeof(float);
+    }
+
+    vector<float> floats_;
+    std::size_t used_ = 0;
+};
+
+/// An accessor to samples, which are borrowed; null if there are none.
+ref<GLTF::Accessor> makeOutput(Type type, const void* samples, std::size_t count) {
+    if (count == 0)
+        return nullptr;
+    const std::size_t length =
+        count * sizeof(float) * static_cast<std::size_t>(GLTF::Accessor::numberOfComponents(type));
+    auto accessor = base::makeRef<GLTF::Accessor>(
+        type, GLTF::componentFloat, 0, static_cast<i32>(count),
+        base::makeRef<GLTF::BufferView>(samples, static_cast<i32>(length),
+                                        GLTF::BufferView::noTarget, false));
+    accessor->computeMinMax();
+    return accessor;
 }
 
-/// Moves the samples of all entries into the document.
+/// Gives the samples of all entries to the document.
 class SampleWriter {
 public:
     SampleWriter(GLTF::Asset& asset, const SampleGrid& grid) : asset_(asset), grid_(grid) {}
@@ -171,13 +205,15 @@ public:
         for (const ref<Channel>& channel : std::as_const(entry.animation->channels)) {
             switch (channel->target.path) {
             case Channel::translation:
-                channel->sampler.output = takeSamples(Type::vec3, entry.translations);
+                channel->sampler.output =
+                    makeOutput(Type::vec3, entry.translations, entry.sampleCount);
                 break;
             case Channel::scale:
-                channel->sampler.output = takeSamples(Type::vec3, entry.scales);
+                channel->sampler.output = makeOutput(Type::vec3, entry.scales, entry.sampleCount);
                 break;
             default:
-                channel->sampler.output = takeSamples(Type::vec4, entry.rotations);
+                channel->sampler.output =
+                    makeOutput(Type::vec4, entry.rotations, entry.sampleCount);
                 break;
             }
         }
@@ -240,8 +276,10 @@ void GLTFScenePlugin::bakeAnimations(GLTF::Asset& asset, IPlugin& scene) {
                         "gltf |{}| The animation is so late that frames have the same time, those "
                         "are left out!",
                         scene.getName());
+    SampleRoom room(byteCount(grid, nodeAnimations));
     for (NodeAnimation& entry : nodeAnimations)
-        reserveSamples(entry, grid.countWithin({entry.start, entry.end}));
+        room.give(entry, grid.countWithin({entry.start, entry.end}));
+    samples_ = room.take();
     for (MorphAnimation& entry : morphAnimations)
         entry.weights.reserve(grid.countWithin({entry.start, entry.end}) * entry.targets.size());
     {

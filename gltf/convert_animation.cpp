@@ -61,12 +61,13 @@ void GLTFScenePlugin::sampleNodeAnimation(NodeAnimation& entry, TimeCode time) {
         faults |= scene::INode::faultNotFinite;
     if (faults != 0)
         logTransformFaults(*entry.node, faults);
-    if ((entry.paths & 1u << Channel::translation) != 0)
-        entry.translations.push_back(parts.translation);
-    if ((entry.paths & 1u << Channel::scale) != 0)
-        entry.scales.push_back(parts.scale);
-    if ((entry.paths & 1u << Channel::rotation) != 0)
-        entry.rotations.push_back(parts.rotation);
+    if (entry.translations)
+        entry.translations[entry.sampleCount] = parts.translation;
+    if (entry.scales)
+        entry.scales[entry.sampleCount] = parts.scale;
+    if (entry.rotations)
+        entry.rotations[entry.sampleCount] = parts.rotation;
+    ++entry.sampleCount;
 }
 
 } // namespace gltf

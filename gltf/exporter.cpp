@@ -147,6 +147,7 @@ void GLTFScenePlugin::clearTables() {
     meshMap.clear();
     linesMap.clear();
     nodeAnimations.clear();
+    samples_ = {};
     morphAnimations.clear();
     morphTargets_.clear();
     morphBases_.clear();

@@ -88,7 +88,7 @@ public:
     /// Null for what has no counterpart.
     base::hash_map<const base::IPlugin*, base::ref<GLTF::Material>> materialMap;
     TextureExport textures{*this};
-    base::vector<NodeAnimation> nodeAnimations;
+    base::vector<NodeAnimation> nodeAnimations; ///< the document borrows their samples
     base::vector<MorphAnimation> morphAnimations;
     base::u32 linesIndex = 0; ///< number of lines converted so far
 
@@ -138,6 +138,7 @@ private:
     base::hash_map<const scene::INode*, bool> walkedNodes_;
     base::u32 nodeCount_ = 0; ///< nodes placed in the tree
     base::ref<GLTF::Node> gltfRoot_;
+    base::vector<float> samples_; ///< of all animated nodes
     /// The joints that skins came to before the walk, in that order.
     base::vector<const scene::INode*> expectedJoints_;
     /// The places of the targets that the document has of each morph.
