@@ -13,6 +13,13 @@ namespace base {
 class AttribArray;
 class AttribLink;
 class AttribMap;
+class DataReader;
+class DataWriter;
+class Stream;
+struct BinaryReadOptions;
+struct BinaryWriteOptions;
+struct JSONReadOptions;
+struct JSONWriteOptions;
 
 /// Bits of an attribute's flags word, by position.
 enum AttribFlag : u32 {
@@ -51,6 +58,20 @@ public:
     /// references, 6 i32, 8 TimeCode, 10 float, 11 double, -1 for everything else. Composite
     /// values answer for their component.
     virtual i8 elementCode() const = 0;
+
+    // The stored forms, see `b_attribute_json.h` and `b_attribute_binary.h`.
+
+    /// Writes the value, in the form that tells its type where the value alone does not.
+    virtual void writeJson(DataWriter& out, JSONWriteOptions& options) const = 0;
+    /// Writes the low eight bits of the flags; overriders put the value behind them.
+    virtual void write(Stream& stream, BinaryWriteOptions& options) const;
+    /// Reads the value that `in` stands at, without the form that tells its type, and leaves `in`
+    /// behind it. False, and a neutral value, if it is none of this type.
+    virtual bool readJson(DataReader& in, JSONReadOptions& options) = 0;
+    /// Reads the low eight bits of the flags, the others stay; overriders read the value behind
+    /// them. False if the data ended before that: what was whole is kept.
+    virtual bool read(Stream& stream, BinaryReadOptions& options);
+
     /// Address of the whole value (-1) or of one element of it: a component of a scalar (index 0
     /// of a value without components is the value), an element of a vector, the value of the
     /// attribute in an array or map. Null for an index without element. Asking for an element of
@@ -111,6 +132,10 @@ public:
     name_id type() const override { return TypeTraits<T>::n_name; }
     Attribute* clone() const override;
     i8 elementCode() const override;
+    void writeJson(DataWriter& out, JSONWriteOptions& options) const override;
+    void write(Stream& stream, BinaryWriteOptions& options) const override;
+    bool readJson(DataReader& in, JSONReadOptions& options) override;
+    bool read(Stream& stream, BinaryReadOptions& options) override;
     void* data(i32 index = -1) override;
     using Attribute::data;
     u32 byteSize() const override;
@@ -138,6 +163,10 @@ public:
     name_id type() const override { return TypeTraits<T>::n_array_name; }
     Attribute* clone() const override;
     i8 elementCode() const override;
+    void writeJson(DataWriter& out, JSONWriteOptions& options) const override;
+    void write(Stream& stream, BinaryWriteOptions& options) const override;
+    bool readJson(DataReader& in, JSONReadOptions& options) override;
+    bool read(Stream& stream, BinaryReadOptions& options) override;
     void* data(i32 index = -1) override;
     using Attribute::data;
     u32 size() const override { return static_cast<u32>(value_.size()); }
@@ -199,6 +228,10 @@ public:
     using Attribute::asArray;
     Attribute* clone() const override;
     i8 elementCode() const override { return -1; }
+    void writeJson(DataWriter& out, JSONWriteOptions& options) const override;
+    void write(Stream& stream, BinaryWriteOptions& options) const override;
+    bool readJson(DataReader& in, JSONReadOptions& options) override;
+    bool read(Stream& stream, BinaryReadOptions& options) override;
     void* data(i32 index = -1) override;
     using Attribute::data;
     u32 size() const override { return static_cast<u32>(items_.size()); }
@@ -243,6 +276,10 @@ public:
     using Attribute::asLink;
     Attribute* clone() const override;
     i8 elementCode() const override { return -1; }
+    void writeJson(DataWriter& out, JSONWriteOptions& options) const override;
+    void write(Stream& stream, BinaryWriteOptions& options) const override;
+    bool readJson(DataReader& in, JSONReadOptions& options) override;
+    bool read(Stream& stream, BinaryReadOptions& options) override;
     void* data(i32 index = -1) override;
     using Attribute::data;
     u32 byteSize() const override { return 12; }

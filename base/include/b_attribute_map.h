@@ -25,6 +25,10 @@ public:
     using Attribute::asMap;
     Attribute* clone() const override;
     i8 elementCode() const override { return -1; }
+    void writeJson(DataWriter& out, JSONWriteOptions& options) const override;
+    void write(Stream& stream, BinaryWriteOptions& options) const override;
+    bool readJson(DataReader& in, JSONReadOptions& options) override;
+    bool read(Stream& stream, BinaryReadOptions& options) override;
     void* data(i32 index = -1) override;
     using Attribute::data;
     u32 size() const override { return static_cast<u32>(entries_.size()); }

@@ -63,6 +63,9 @@ public:
     AttribPath& attribute(name_id name);
     AttribPath& element(u32 index);
     AttribPath& component(u32 index);
+    /// Of any kind, as it was stored. One of kind `plugin` belongs first; it has no object until
+    /// `setRoot` and keeps its index without one.
+    AttribPath& step(PathStepKind kind, name_id name, u32 index);
 
     bool empty() const noexcept { return steps_.empty(); }
     const vector<PathStep>& steps() const noexcept { return steps_; }

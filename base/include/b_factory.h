@@ -13,6 +13,7 @@ class AttribPath;
 class CmdLineOptions;
 class IPlugin;
 class PluginFactory;
+class Stream;
 
 /// A mix-in that an object exposes by name.
 class BASE1_API IPluginInterface {
@@ -220,6 +221,26 @@ public:
     /// object is logged and skipped if this factory had one of its type and name before; that one
     /// stands for it.
     void merge(const PluginFactory& other);
+
+    // The stored forms of the whole document: its own attributes and all objects with their ids.
+    // Left out are attributes and objects that are transient; an entry of the list without object
+    // stays one. Reading appends the objects to this factory, ids shifted by the present length of
+    // the list, adds the document's attributes to the factory's, and calls `afterLoad` on all that
+    // was read. Whatever ends a reading early takes the objects that it made away again.
+
+    /// Writes the binary form at the stream's position. Throws `exception` for what has no place
+    /// in it, such as an object of more than 4 GiB, and what the stream throws.
+    void write(Stream& stream) const;
+    /// Reads the binary form from the stream's position. Throws `exception` for a file of another
+    /// kind or version and, with `streamThrowOnShortRead`, for one that is cut. False if the list
+    /// of objects is broken; the log tells where.
+    bool read(Stream& stream);
+    /// Writes the JSON form; the same scene gives the same text in every process.
+    void writeJson(Stream& stream) const;
+    /// Reads the JSON form to the end of the stream. False if it is no such document. The log tells
+    /// of all faults, with the stream's name and the line; a value that can't be read costs only
+    /// the attribute that it belongs to.
+    bool readJson(Stream& stream);
 
     /// Listeners are not owned.
     void addCallback(PluginCallback* callback);

@@ -54,14 +54,6 @@ void appendIndex(string& out, char open, u32 index, char close) {
     out += close;
 }
 
-PathStep makeStep(PathStepKind kind, name_id name, u32 index) {
-    PathStep step;
-    step.name = name;
-    step.index = index;
-    step.kind = kind;
-    return step;
-}
-
 } // namespace
 
 void AttribWeakLink::set(Attribute* target) noexcept {
@@ -93,17 +85,22 @@ AttribPath::AttribPath(IPlugin& root, name_id name) : AttribPath(root) {
 }
 
 AttribPath& AttribPath::attribute(name_id name) {
-    steps_.push_back(makeStep(PathStepKind::attribute, name, 0));
-    return *this;
+    return step(PathStepKind::attribute, name, 0);
 }
 
 AttribPath& AttribPath::element(u32 index) {
-    steps_.push_back(makeStep(PathStepKind::element, {}, index));
-    return *this;
+    return step(PathStepKind::element, {}, index);
 }
 
 AttribPath& AttribPath::component(u32 index) {
-    steps_.push_back(makeStep(PathStepKind::component, {}, index));
+    return step(PathStepKind::component, {}, index);
+}
+
+AttribPath& AttribPath::step(PathStepKind kind, name_id name, u32 index) {
+    PathStep& made = steps_.emplace_back();
+    made.name = name;
+    made.index = index;
+    made.kind = kind;
     return *this;
 }
 
@@ -116,7 +113,7 @@ IPlugin* AttribPath::root() const noexcept {
 
 void AttribPath::setRoot(IPlugin& root) {
     if (steps_.empty())
-        steps_.push_back(makeStep(PathStepKind::plugin, nameServer().emptyName(), 0));
+        step(PathStepKind::plugin, nameServer().emptyName(), 0);
     for (PathStep& step : steps_)
         step.target.set(nullptr);
     steps_[0].target.set(&root);
