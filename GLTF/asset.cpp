@@ -60,6 +60,13 @@ public:
         });
         writeImages();
         writeList("samplers", samplers_, [](Sampler&) {});
+        writeList("techniques", techniques_,
+                  [this](Technique& technique) { programs_.add(technique.program); });
+        writeList("programs", programs_, [this](Program& program) {
+            shaders_.add(program.fragmentShader);
+            shaders_.add(program.vertexShader);
+        });
+        writeList("shaders", shaders_, [](Shader&) {});
         writeList("bufferViews", views_, [this](BufferView& view) { buffers_.add(view.buffer); });
         writeBuffers();
         writeNames("extensionsRequired", asset_.extensionsRequired);
@@ -203,6 +210,12 @@ private:
     }
 
     void number(Material& material) {
+        if (material.type == Material::Type::plain && material.technique) {
+            techniques_.add(material.technique);
+            asset_.requireExtension("KHR_technique_webgl");
+        }
+        collect::forEachValueTexture(
+            material, [this](const ref<Texture>& texture) { textures_.add(texture); });
         if (material.type == Material::Type::common) {
             asset_.requireExtension("KHR_materials_common");
             hasCommonMaterial_ = true;
@@ -275,6 +288,9 @@ private:
     IndexedList<Texture> textures_;
     IndexedList<Image> images_;
     IndexedList<Sampler> samplers_;
+    IndexedList<Technique> techniques_;
+    IndexedList<Program> programs_;
+    IndexedList<Shader> shaders_;
     IndexedList<BufferView> views_;
     IndexedList<Buffer> buffers_;
     bool hasCommonMaterial_ = false;

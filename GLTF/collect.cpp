@@ -94,6 +94,8 @@ vector<Texture*> Asset::getAllTextures() {
     const Walk walk;
     vector<Texture*> taken;
     for (const Material* material : materials) {
+        collect::forEachValueTexture(
+            *material, [&](const ref<Texture>& texture) { take(walk, taken, texture); });
         if (const auto* pbr = dynamic_cast<const MaterialPBR*>(material))
             collect::forEachTextureSlot(
                 *pbr, [&](const MaterialPBR::Texture& slot) { take(walk, taken, slot.texture); });

@@ -29,6 +29,17 @@ void forEachAttribute(const Primitive& primitive, Function&& function) {
     }
 }
 
+/// Calls `function` for the textures among the values of a plain or common material, null ones
+/// too. The other kind does not write its values.
+template <class Function>
+void forEachValueTexture(const Material& material, Function&& function) {
+    const Material::Values* values = material.values.get();
+    if (values && material.type != Material::Type::pbr)
+        for (const auto* slot :
+             {&values->ambient, &values->diffuse, &values->emission, &values->specular})
+            function(slot->texture);
+}
+
 /// Calls `function` for each texture slot of a material, in the order in which textures are
 /// collected, which is not the order in which they are numbered.
 template <class Function>

@@ -32,6 +32,7 @@ class Accessor;
 class Asset;
 class JsonWriter;
 class Node;
+class Technique;
 
 /// Key of the Draco extension in `Object::extensions` of a primitive.
 constexpr string_view dracoExtensionName = "KHR_draco_mesh_compression";
@@ -260,13 +261,32 @@ public:
     ref<Image> source;
 };
 
+/// Base of the kinds of materials, and the plain kind, which a technique draws.
 class Material : public Object {
 public:
     enum class Type : i32 { plain = 0, common = 1, pbr = 2 };
+
+    /// Inputs of the plain and common kinds. What is not set is not written.
+    struct Values {
+        struct Slot {
+            ref<Texture> texture; ///< takes the place of the colour
+            std::optional<std::array<float, 4>> color;
+        };
+        /// Writes the members into the JSON object that the caller has opened.
+        void writeJSON(JsonWriter& writer) const;
+
+        Slot ambient, diffuse, emission, specular;
+        std::optional<float> shininess, transparency;
+    };
+
+    Material();
     ~Material() override;
     string typeName() const override;
+    void writeJSON(JsonWriter& writer, const Options& options) override;
 
+    ref<Technique> technique;
     Type type = Type::plain;
+    std::unique_ptr<Values> values; ///< null where there are none
 };
 
 class MaterialPBR : public Material {
@@ -321,9 +341,11 @@ public:
     bool doubleSided = false;
 };
 
-/// The material kind that carries lights; only its light record is in use.
+/// The material kind of the extension that carries lights. The exporter makes none, only lights.
 class MaterialCommon : public Material {
 public:
+    enum class Kind : i32 { blinn, phong, lambert, constant };
+
     class Light : public Object {
     public:
         enum class Type : i32 { ambient, directional, point, spot, unknown };
@@ -339,6 +361,73 @@ public:
     };
     MaterialCommon() { type = Type::common; }
     ~MaterialCommon() override;
+    void writeJSON(JsonWriter& writer, const Options& options) override;
+    /// The features of this material, each ended by ";": materials of the same key could be drawn
+    /// by the same technique.
+    string techniqueKey() const;
+
+    Kind technique = Kind::lambert; ///< how light is reflected; no generated technique
+    i32 jointCount = 0;             ///< of the skins that it is used with; 0 without one
+    bool transparent = false;
+    bool doubleSided = false;
+};
+
+// Techniques: how a plain material is drawn. They are records with their written forms; nothing
+// here generates shaders. Empty members are left out.
+
+/// The text of one shader.
+class Shader : public Object {
+public:
+    static constexpr i32 fragmentShader = 35632;
+    static constexpr i32 vertexShader = 35633;
+
+    explicit Shader(i32 shaderType) : type(shaderType) {}
+    ~Shader() override;
+    string typeName() const override;
+    void writeJSON(JsonWriter& writer, const Options& options) override;
+
+    i32 type;
+    string source;
+    string uri; ///< filled by `writeJSON`
+};
+
+class Program : public Object {
+public:
+    ~Program() override;
+    string typeName() const override;
+    void writeJSON(JsonWriter& writer, const Options& options) override;
+
+    base::set<string> attributes; ///< inputs of the vertex shader
+    ref<Shader> fragmentShader;
+    ref<Shader> vertexShader;
+};
+
+class Technique : public Object {
+public:
+    struct Parameter {
+        string semantic;
+        ref<Node> node;      ///< whose transform it is
+        vector<float> value; ///< one number, or the components of a vector or matrix
+        i32 count = 0;       ///< of elements; 0 where it is no array
+        i32 type = 0;        ///< the number that WebGL has for it
+    };
+    /// Render states, by the numbers that WebGL has for them.
+    struct States {
+        vector<i32> enable;
+        std::optional<bool> depthMask;
+        vector<i32> blendEquationSeparate; ///< for colour and alpha
+        vector<i32> blendFuncSeparate;     ///< source and target for colour, then for alpha
+    };
+
+    ~Technique() override;
+    string typeName() const override;
+    void writeJSON(JsonWriter& writer, const Options& options) override;
+
+    flat_map<string, string> attributes; ///< parameter by the name in the shader
+    flat_map<string, Parameter> parameters;
+    ref<Program> program;
+    States states;
+    flat_map<string, string> uniforms; ///< parameter by the name in the shader
 };
 
 // Structure

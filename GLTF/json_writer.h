@@ -66,6 +66,7 @@ public:
         char* const start = os_->Push(floatRoom);
         pop(floatRoom, start, putFloat(value, start));
     }
+    void boolValue(bool value) { Bool(value); }
     /// Bytes that are not UTF-8 become U+FFFD. Throws `base::exception` for a text above 2^28
     /// bytes.
     void textValue(string_view value);

@@ -55,12 +55,6 @@ void Texture::writeJSON(JsonWriter& writer, const Options& options) {
     Object::writeJSON(writer, options);
 }
 
-Material::~Material() = default;
-
-string Material::typeName() const {
-    return "material";
-}
-
 MaterialPBR::Texture::~Texture() = default;
 
 void MaterialPBR::Texture::writeJSON(JsonWriter& writer, const Options& options) {
@@ -129,8 +123,6 @@ void MaterialPBR::writeJSON(JsonWriter& writer, const Options& options) {
         writer.boolMember("doubleSided", true);
     Object::writeJSON(writer, options);
 }
-
-MaterialCommon::~MaterialCommon() = default;
 
 MaterialCommon::Light::~Light() = default;
 
