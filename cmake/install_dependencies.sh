@@ -19,7 +19,7 @@ install_packages() {
 
 build_packages=(
     g++ cmake ninja-build pkg-config
-    libpng-dev libjpeg62-turbo-dev rapidjson-dev libdraco-dev libxxhash-dev libgeos-dev libassimp-dev
-    libstb-dev
+    libpng-dev libjpeg62-turbo-dev rapidjson-dev libdraco-dev libxxhash-dev libpugixml-dev libgeos-dev
+    libassimp-dev libstb-dev
     libgtest-dev libgmock-dev libbenchmark-dev
 )

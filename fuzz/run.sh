@@ -1,14 +1,15 @@
 #!/usr/bin/env bash
 # Builds the fuzz targets and runs each of them: fuzz/run.sh [SECONDS [FORMAT...]]
-# SECONDS (60) count for each format: tga, png, jpeg. Fails on the first fault; the input that
-# leads to it lies in build/fuzz/faults/ then, and the target reproduces it when given its path.
+# SECONDS (60) count for each format: tga, png, jpeg, description, binary, json. Fails on the first
+# fault; the input that leads to it lies in build/fuzz/faults/ then, and the target reproduces it
+# when given its path.
 set -euo pipefail
 cd -- "$(dirname -- "${BASH_SOURCE[0]}")/.."
 
 seconds=${1:-60}
 shift $(($# > 0 ? 1 : 0))
 formats=("$@")
-[ ${#formats[@]} -gt 0 ] || formats=(tga png jpeg)
+[ ${#formats[@]} -gt 0 ] || formats=(tga png jpeg description binary json)
 
 cmake --preset fuzz
 cmake --build --preset fuzz --parallel "${JOBS:-$(nproc)}" --target "${formats[@]/#/fuzz_}"
@@ -16,9 +17,11 @@ cmake --build --preset fuzz --parallel "${JOBS:-$(nproc)}" --target "${formats[@
 # A larger block counts as one that could not be had, which the readers must survive.
 export ASAN_OPTIONS=allocator_may_return_null=1:max_allocation_size_mb=64
 for format in "${formats[@]}"; do
-    # A TGA file has to pay for its memory: 4096 bytes are good for about a megabyte.
+    # These have to pay for their memory: 4096 bytes are good for about a megabyte. The index of
+    # names, which stay to the end of the process, grows beyond that in documents.
     malloc_limit=512
     [ "$format" = tga ] && malloc_limit=2
+    [ "$format" = binary ] && malloc_limit=32
     corpus=build/fuzz/corpus/$format
     mkdir -p "$corpus" build/fuzz/faults
     echo "== $format"

@@ -206,9 +206,10 @@ public:
     const vector<ref<IPlugin>>& plugins() const noexcept { return plugins_; }
     /// The first object by id whose name is `text`, -1 if there is none.
     i32 findByName(string_view text) const;
-    /// The first object by id of exactly this type, -1 if there is none.
+    /// The first object by id of this type or of one that derives from it by the loaded
+    /// descriptions (`AttribDescManager::derived`), -1 if there is none.
     i32 findByType(name_id type) const;
-    /// The same object, null if there is none.
+    /// The first object by id of exactly this type, null if there is none.
     ref<IPlugin> firstOfType(name_id type) const;
     /// Sum of `byteSize` over all objects.
     u64 memorySize() const;

@@ -1,50 +1,331 @@
-#include "b_attribute_json.h"
-
-#include "b_factory.h"
+#include "b_attribute_json_forms.h"
+#include "b_log.h"
 
 namespace base {
 
-template <class T>
-void TypedAttribute<T>::writeJson(DataWriter&, JSONWriteOptions&) const {}
-template <class T>
-bool TypedAttribute<T>::readJson(DataReader&, JSONReadOptions&) {
-    return false;
-}
-template <class T>
-void TypedVectorAttribute<T>::writeJson(DataWriter&, JSONWriteOptions&) const {}
-template <class T>
-bool TypedVectorAttribute<T>::readJson(DataReader&, JSONReadOptions&) {
-    return false;
+namespace {
+
+constexpr i32 documentVersion = 1;
+constexpr string_view documentOwner = "document"; // in messages
+constexpr string_view versionMember = "@version";
+constexpr string_view attributesMember = "@attributes";
+constexpr string_view objectsMember = "@objects";
+
+/// Reports how far a list is, as often as the percentage changes, and the end when it dies.
+class Progress : public NonCopyable {
+public:
+    Progress(string_view text, std::size_t count) : text_(text), count_(count) {}
+    ~Progress() { log().progressEnd(); }
+    void at(std::size_t index) {
+        const u32 percent = static_cast<u32>(u64{index} * 100 / count_);
+        if (percent != std::exchange(percent_, percent))
+            log().progress(percent, text_);
+    }
+
+private:
+    string_view text_;
+    std::size_t count_;
+    u32 percent_ = 101; ///< the last that was reported
+};
+
+/// Names that a single one of the objects has.
+hash_map<string_view, u32> uniqueNames(const PluginFactory& factory,
+                                       const JSONWriteOptions& options) {
+    hash_map<string_view, u32> ids;
+    ids.reserve(factory.pluginCount());
+    for (const ref<IPlugin>& object : factory.plugins()) {
+        const string* name = object && isWritten(*object, options) ? plainNameOf(*object) : nullptr;
+        if (!name)
+            continue;
+        const auto [at, isNew] = ids.emplace(*name, object->id());
+        if (!isNew)
+            at->second = IPlugin::noId;
+    }
+    return ids;
 }
 
-// The rest of these classes is compiled elsewhere, so the members are instantiated one by one.
-#define BASE_INSTANTIATE_SCALAR(T, text)                                                        \
-    template BASE1_API void TypedAttribute<T>::writeJson(DataWriter&, JSONWriteOptions&) const; \
-    template BASE1_API bool TypedAttribute<T>::readJson(DataReader&, JSONReadOptions&);
-#define BASE_INSTANTIATE_VECTOR(T, text)                                                       \
-    template BASE1_API void TypedVectorAttribute<T>::writeJson(DataWriter&, JSONWriteOptions&) \
-        const;                                                                                 \
-    template BASE1_API bool TypedVectorAttribute<T>::readJson(DataReader&, JSONReadOptions&);
-BASE_FULL_TYPES(BASE_INSTANTIATE_SCALAR)
-BASE_SCALAR_TYPES(BASE_INSTANTIATE_SCALAR)
-BASE_FULL_TYPES(BASE_INSTANTIATE_VECTOR)
-BASE_ARRAY_TYPES(BASE_INSTANTIATE_VECTOR)
+bool isEmptyDocument(const AttribMap& attributes) {
+    return (attributes.flags() & storedFlags) == 0 && attributes.typeName().isEmpty() &&
+           std::all_of(attributes.entries().begin(), attributes.entries().end(),
+                       [](const AttribMap::Entry& entry) { return isLeftOut(*entry.second); });
+}
 
-void AttribArray::writeJson(DataWriter&, JSONWriteOptions&) const {}
-bool AttribArray::readJson(DataReader&, JSONReadOptions&) {
-    return false;
+void writeObject(const IPlugin& object, DataWriter& out, JSONWriteOptions& options) {
+    const NestedValue nested(options.depth);
+    const string* name = plainNameOf(object);
+    options.owner = name ? *name : object.typeName().view();
+    out.beginObject();
+    out.name("@type");
+    string repaired;
+    out.text(validText(object.typeName(), options, repaired));
+    writeFlags(out, object.flags());
+    writeMembers(object, out, options);
+    out.endObject();
 }
-void AttribLink::writeJson(DataWriter&, JSONWriteOptions&) const {}
-bool AttribLink::readJson(DataReader&, JSONReadOptions&) {
-    return false;
+
+/// Takes over what a reader made of the document's attributes.
+void addAttributes(AttribMap& target, const Attribute& read) {
+    target.assign(read, assignAdopt);
+    target.setFlags((target.flags() & ~storedFlags) | (read.flags() & storedFlags));
+    target.setTypeName(read.asMap()->typeName());
 }
-void AttribMap::writeJson(DataWriter&, JSONWriteOptions&) const {}
-bool AttribMap::readJson(DataReader&, JSONReadOptions&) {
-    return false;
+
+/// The members of a document, and its objects once they are made.
+class DocumentReader {
+public:
+    DocumentReader(PluginFactory& factory, DataReader& in) : factory_(factory), in_(in) {
+        options_.attribFactory = &factory.attributeFactory();
+        options_.firstId = factory.pluginCount();
+        options_.owner = documentOwner;
+    }
+
+    u32 objectCount() const { return static_cast<u32>(options_.objects.size()); }
+
+    /// The parts of the document. False, with a message, if it is none.
+    bool readHead() {
+        if (in_.kind() != DataKind::object) {
+            logAtLine("Missing object opening bracket!");
+            return false;
+        }
+        static constexpr string_view known[] = {versionMember, attributesMember, objectsMember};
+        JsonMembers members;
+        collectMembers(in_, members);
+        checkOwnMembers(members, known, in_, options_);
+        warnOfForeign(members);
+        attributes_ = placeOf(members, attributesMember);
+        return checkVersion(placeOf(members, versionMember)) &&
+               findObjects(placeOf(members, objectsMember));
+    }
+
+    /// Makes all objects at once, so that references find theirs whatever their order. Their places
+    /// have to be in the factory's list, empty.
+    void createObjects() {
+        for (u32 place = 0; place < objectCount(); ++place) {
+            in_.setPlace(std::as_const(places_)[place]);
+            if (in_.kind() == DataKind::null)
+                continue;
+            if (in_.kind() != DataKind::object) {
+                logAtLine("Missing object opening bracket!");
+                logAtLine("Error reading plugin!");
+                continue;
+            }
+            createObject(place);
+        }
+    }
+
+    void readObjects() {
+        Progress progress("Reading plugins", objectCount());
+        for (u32 place = 0; place < objectCount(); ++place) {
+            progress.at(place);
+            if (const ref<IPlugin> object = std::as_const(options_.objects)[place]) {
+                in_.setPlace(std::as_const(places_)[place]);
+                readObject(*object);
+            }
+        }
+    }
+
+    /// The document's own attributes; null if there are none.
+    std::unique_ptr<Attribute> readAttributes() {
+        if (attributes_ == noPlace)
+            return nullptr;
+        in_.setPlace(attributes_);
+        options_.owner = documentOwner;
+        options_.attribute = nameServer().id(attributesMember);
+        std::unique_ptr<Attribute> read;
+        if (in_.kind() == DataKind::object)
+            read.reset(readJsonAttribute(in_, options_));
+        if (read && read->asMap())
+            return read;
+        in_.setPlace(attributes_);
+        logUnreadable(in_, options_, n_map.view());
+        return nullptr;
+    }
+
+private:
+    static constexpr u32 noPlace = 0xffffffff;
+
+    static u32 placeOf(const JsonMembers& members, string_view name) {
+        const DataMember* found = findMember(members, name);
+        return found ? found->place : noPlace;
+    }
+
+    void logAtLine(string_view text) const {
+        log().log(logSystem, logError, "json parser {}({})| {}", in_.source(), in_.line(), text);
+    }
+
+    void warnOfForeign(const JsonMembers& members) {
+        for (const DataMember& member : members) {
+            if (isOwnMember(member))
+                continue;
+            in_.setPlace(member.place);
+            logIgnored(in_, options_, member.name);
+        }
+    }
+
+    bool checkVersion(u32 place) {
+        i64 version = 0;
+        if (place != noPlace) {
+            in_.setPlace(place);
+            if (!in_.number(version))
+                version = 0;
+            in_.setPlace(place);
+        }
+        if (version == documentVersion)
+            return true;
+        log().log(logSystem, logError,
+                  "json parser {}({})| Unsupported document version! Current version {}, needed "
+                  "{}.",
+                  in_.source(), in_.line(), documentVersion, version);
+        return false;
+    }
+
+    bool findObjects(u32 place) {
+        if (place == noPlace)
+            return true;
+        in_.setPlace(place);
+        if (in_.kind() != DataKind::array) {
+            logExpectedArray(in_);
+            return false;
+        }
+        const u32 count = in_.length();
+        if (u64{options_.firstId} + count >= JSONReadOptions::severalObjects) {
+            logAtLine("Too many plugins!");
+            return false;
+        }
+        places_.reserve(count);
+        for (in_.enter(); in_.kind() != DataKind::end; in_.skip())
+            places_.push_back(in_.place());
+        options_.objects.resize(count);
+        options_.placeOfName.reserve(count);
+        return true;
+    }
+
+    void createObject(u32 place) {
+        string_view typeText, name;
+        bool hasType = false;
+        in_.enter();
+        for (DataMember member; in_.nextMember(member);) {
+            if (member.name == "@type")
+                hasType = readNameText(&member, typeText) && !typeText.empty();
+            else if (member.name == "name")
+                name = member.text;
+        }
+        if (!hasType) {
+            in_.setPlace(std::as_const(places_)[place]);
+            logAtLine("Error reading plugin!");
+            return;
+        }
+        const name_id type = validName(typeText);
+        if (!factory_.hasDesc(type))
+            registerDummy(type);
+        options_.objects[place] = factory_.createAt(type, options_.firstId + place);
+        if (name.empty())
+            return;
+        const auto [at, isNew] = options_.placeOfName.emplace(name, place);
+        if (!isNew)
+            at->second |= JSONReadOptions::severalObjects;
+    }
+
+    void registerDummy(name_id type) {
+        log().log(logSystem, logWarning,
+                  "plugin factory| Unsupported plugin type {}! Objects of this type will have "
+                  "limited functionality.",
+                  type);
+        factory_.create(type, createLoose); // which the list does without
+    }
+
+    void readObject(IPlugin& object) {
+        static constexpr string_view known[] = {"@type", "@flags"};
+        const u32 start = in_.place();
+        JsonMembers members;
+        collectMembers(in_, members);
+        in_.setPlace(start);
+        string_view name;
+        const bool hasName = readNameText(findMember(members, "name"), name) && !name.empty();
+        options_.owner = hasName ? name : object.typeName().view();
+        options_.attribute = {};
+
+        const NestedValue nested(options_.depth);
+        checkOwnMembers(members, known, in_, options_);
+        u32 flags = 0;
+        if (readFlags(findMember(members, "@flags"), in_, options_, flags))
+            object.setFlags((object.flags() & ~storedFlags) | flags);
+        readMembers(object, members, in_, options_);
+    }
+
+    PluginFactory& factory_;
+    DataReader& in_;
+    JSONReadOptions options_;
+    u32 attributes_ = noPlace;
+    vector<u32> places_; ///< of the objects in the text
+};
+
+} // namespace
+
+void PluginFactory::writeJson(Stream& stream) const {
+    JSONWriteOptions options;
+    options.factory = this;
+    options.idOfName = uniqueNames(*this, options);
+    JSONAttrWriter out(stream);
+    out.beginObject();
+    out.name(versionMember);
+    out.number(documentVersion);
+    if (!isEmptyDocument(attributes_)) {
+        options.owner = documentOwner;
+        out.name(attributesMember);
+        attributes_.writeJson(out, options);
+    }
+
+    Progress progress("Writing plugins", plugins_.size());
+    out.name(objectsMember);
+    out.beginArray();
+    for (std::size_t i = 0; i < plugins_.size(); ++i) {
+        progress.at(i);
+        const ref<IPlugin>& object = plugins_[i];
+        if (object && isWritten(*object, options))
+            writeObject(*object, out, options);
+        else
+            out.null();
+    }
+    out.endArray();
+    out.endObject();
+    out.finish();
 }
-void PluginFactory::writeJson(Stream&) const {}
-bool PluginFactory::readJson(Stream&) {
-    return false;
+
+bool PluginFactory::readJson(Stream& stream) {
+    JSONAttrReader in;
+    if (!in.open(stream))
+        return false;
+    DocumentReader document(*this, in);
+    if (!document.readHead())
+        return false;
+
+    const u32 firstId = pluginCount();
+    std::unique_ptr<Attribute> attributesBefore;
+    try {
+        plugins_.resize(firstId + document.objectCount());
+        document.createObjects();
+        document.readObjects();
+        if (const std::unique_ptr<Attribute> read = document.readAttributes()) {
+            attributesBefore.reset(attributes_.clone());
+            addAttributes(attributes_, *read);
+        }
+        afterLoadAll(documentVersion, firstId);
+    } catch (...) {
+        if (attributesBefore) {
+            attributes_.clear();
+            addAttributes(attributes_, *attributesBefore);
+        }
+        for (u32 id = firstId; id < pluginCount(); ++id) {
+            if (const ref<IPlugin> object = plugin(id)) {
+                object->clear(); // their references to each other
+                remove(id, true);
+            }
+        }
+        plugins_.resize(firstId);
+        throw;
+    }
+    return true;
 }
 
 } // namespace base

@@ -1,5 +1,6 @@
 #include "b_factory.h"
 
+#include "b_attribute_desc.h"
 #include "b_exception.h"
 #include "b_log.h"
 
@@ -259,8 +260,14 @@ i32 PluginFactory::findByName(string_view text) const {
 }
 
 i32 PluginFactory::findByType(name_id type) const {
-    const ref<IPlugin> found = firstOfType(type);
-    return found ? static_cast<i32>(found->id()) : -1;
+    const vector<name_id> derived = attribDescManager().derived(type);
+    for (const ref<IPlugin>& object : plugins_) {
+        const name_id actual = object ? object->typeName() : name_id();
+        if (object &&
+            (actual == type || std::find(derived.begin(), derived.end(), actual) != derived.end()))
+            return static_cast<i32>(object->id());
+    }
+    return -1;
 }
 
 ref<IPlugin> PluginFactory::firstOfType(name_id type) const {
