@@ -180,7 +180,7 @@ bool AssimpImporter::canLoad(const base::string& path) {
 }
 
 bool AssimpImporter::load(base::PluginFactory& scene, const base::string& path) {
-    const bool hasMaterials = read(*this, scene::sceneImporter_schema::n_importMaterials);
+    const bool hasMaterials = scene::read(*this, scene::sceneImporter_schema::n_importMaterials);
     base::string error;
     const std::unique_ptr<aiScene> source = readFile(path, hasMaterials, error);
     if (!source || !source->mRootNode) {

@@ -41,21 +41,21 @@ public:
     bool load(base::PluginFactory& scene, const base::string& path) override {
         const auto document = scene.create(scene::scene_schema::n_kind);
         const auto root = scene.create(scene::node_schema::n_kind);
-        write(*document, scene::scene_schema::n_root) = root;
+        scene::write(*document, scene::scene_schema::n_root) = root;
         // A setting is an attribute of the importer.
-        if (!read(*this, scene::sceneImporter_schema::n_importMeshes))
+        if (!scene::read(*this, scene::sceneImporter_schema::n_importMeshes))
             return true;
 
         const auto mesh = scene.create(scene::mesh_schema::n_kind);
-        write(*root, scene::node_schema::n_children) = {mesh};
-        auto& positions = write(*mesh, scene::mesh_schema::n_positions);
+        scene::write(*root, scene::node_schema::n_children) = {mesh};
+        auto& positions = scene::write(*mesh, scene::mesh_schema::n_positions);
         positions = readCorners(path);
-        auto& indices = write(*mesh, scene::mesh_schema::n_indices);
+        auto& indices = scene::write(*mesh, scene::mesh_schema::n_indices);
         indices.resize(positions.size());
         std::iota(indices.begin(), indices.end(), 0u);
         auto* triangles = new base::AttribMap; // a primitive; the list owns it
-        write(*mesh, scene::mesh_schema::n_primitives).append(triangles);
-        write(*triangles, scene::meshPrimitive_schema::n_vcounts) = {3};
+        scene::write(*mesh, scene::mesh_schema::n_primitives).append(triangles);
+        scene::write(*triangles, scene::meshPrimitive_schema::n_vcounts) = {3};
         return true;
     }
 };

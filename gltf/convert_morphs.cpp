@@ -74,7 +74,7 @@ void GLTFScenePlugin::convertMorphChild(GLTF::Node& gltfNode, base::IPlugin& chi
 vector<u32> GLTFScenePlugin::addTargets(GLTF::Mesh& gltfMesh, const scene::IMorph& morph,
                                         const scene::IMesh& baseMesh) {
     constexpr base::u8 wholeShapes = 1;
-    const bool isWholeShape = read(morph, morph_schema::n_method) == wholeShapes;
+    const bool isWholeShape = scene::read(morph, morph_schema::n_method) == wholeShapes;
     const bool isShared = !gltfMesh.weights.empty();
     bool isRepaired = false;
     vector<u32> targets;

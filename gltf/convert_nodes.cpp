@@ -77,7 +77,7 @@ bool hasAssignment(const IPlugin& lines) {
 
 /// The transform of `node` below `parent`, null at the root.
 mat43 GLTFScenePlugin::findParentFromNode(const scene::INode& node, const TreePosition* parent) {
-    const bool isFree = parent && !read(node, scene::node_schema::n_inheritsTransform);
+    const bool isFree = parent && !scene::read(node, scene::node_schema::n_inheritsTransform);
     mat43 transform;
     u32 faults = 0;
     if (isFree) {
@@ -185,7 +185,8 @@ GLTFScenePlugin::Joint* GLTFScenePlugin::findJoint(const scene::INode& node) {
 /// A node of the document for `node`; for a joint the one that its skins have.
 ref<GLTF::Node> GLTFScenePlugin::placeNode(const scene::INode& node) {
     ++nodeCount_;
-    Joint* joint = read(node, scene::node_schema::n_isJoint) ? &nodeMap[&node] : findJoint(node);
+    Joint* joint =
+        scene::read(node, scene::node_schema::n_isJoint) ? &nodeMap[&node] : findJoint(node);
     if (!joint)
         return base::makeRef<GLTF::Node>();
     if (!joint->node)

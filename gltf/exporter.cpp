@@ -82,7 +82,7 @@ bool GLTFScenePlugin::exportScene(PluginFactory& sceneObjects, const string& pat
     prepareObjects(sceneObjects);
     SceneClock(*sceneObject).tellLayers();
     const ref<GLTF::Asset> asset = makeAsset();
-    convertRoot(*root, read(*sceneObject, scene::scene_schema::n_upAxis));
+    convertRoot(*root, scene::read(*sceneObject, scene::scene_schema::n_upAxis));
     bakeAnimations(*asset, *sceneObject);
     const GLTF::Options options = makeOptions(path);
     const ref<GLTF::Buffer> buffer = runPasses(*asset, options, gltfRoot_);

@@ -384,4 +384,13 @@ Output readOutput(const string& path) {
     return output;
 }
 
+Output findOutput(const vector<string>& paths, u64 objects) {
+    Output output;
+    for (const string& path : paths)
+        if (!isSpecialFile(path))
+            output.files.push_back({path, std::filesystem::file_size(systemPath(path))});
+    output.objects = objects;
+    return output;
+}
+
 } // namespace host

@@ -38,6 +38,7 @@ struct Output {
     /// The main file, then those that it refers to. None if the main file is a pipe or a device.
     base::vector<WrittenFile> files;
     std::optional<DocumentCounts> document; ///< none if the main file is no glTF document
+    std::optional<base::u64> objects;       ///< of a scene document
 
     base::u64 totalBytes() const;
 };
@@ -45,5 +46,8 @@ struct Output {
 /// Reads the main file `path` and looks for the files that it refers to; only regular files are
 /// opened. Throws `base::exception` if it can't be read or is broken.
 Output readOutput(const base::string& path);
+
+/// Looks up the sizes of the files of a scene document with so many objects.
+Output findOutput(const base::vector<base::string>& paths, base::u64 objects);
 
 } // namespace host

@@ -5,6 +5,7 @@
 #include "host/version.h"
 
 #include "b_format.h"
+#include "scene_document.h"
 
 #include <cerrno>
 #include <cstring>
@@ -22,6 +23,8 @@ void loadPlugins(scene::SceneFactory& factory, const base::string& folder) {
 /// One line for what can be read and one for what can be written.
 base::string formatsText(const scene::SceneFactory& factory) {
     const auto list = [](base::string text) {
+        for (const base::string_view extension : scene::sceneDocumentExtensions)
+            text.append(text.empty() ? "" : ";").append(extension);
         for (char& c : text)
             c = c == ';' ? ' ' : c;
         return text;

@@ -39,6 +39,8 @@ constexpr HostOption hostOptions[] = {
      "Prints the file extensions that can be read and written."},
     {"--dry-run", "", &HostOptions::dryRun,
      "Reads INPUT, checks its meshes and tells what would be written, but writes nothing."},
+    {"--dump", "", &HostOptions::dump,
+     "Reads INPUT and prints its scene as a tree of objects. There is no OUTPUT then."},
     {"--strict", "", &HostOptions::strict,
      "Ends with exit code 5 if there was any warning or error. The files are written all the "
      "same."},
@@ -212,9 +214,10 @@ void parseOptions(const CommandLine& line, CmdLineOptions& registered) {
     checkValues(registered, errors);
     if (line.host.quiet && line.host.verbose)
         errors.push_back("options '--quiet' and '--verbose' exclude each other.");
-    if (line.files.size() != 2)
-        errors.push_back(base::format("expected INPUT and OUTPUT, found {} {}.", line.files.size(),
-                                      line.files.size() == 1 ? "path" : "paths"));
+    if (line.files.size() != (line.host.dump ? 1 : 2))
+        errors.push_back(base::format(
+            "expected {}, found {} {}.", line.host.dump ? "INPUT alone" : "INPUT and OUTPUT",
+            line.files.size(), line.files.size() == 1 ? "path" : "paths"));
     if (errors.empty())
         return;
     errors.push_back("the command line is wrong, 'scene_export --help' tells what is right.");
@@ -222,9 +225,10 @@ void parseOptions(const CommandLine& line, CmdLineOptions& registered) {
 }
 
 string helpText(const CmdLineOptions& registered) {
-    string text = "Usage: scene_export [options] INPUT OUTPUT\n\n"
-                  "Reads the model INPUT and writes it as OUTPUT. The extensions of the names tell "
-                  "the formats.\n\n"
+    string text = "Usage: scene_export [options] INPUT OUTPUT\n"
+                  "       scene_export --dump [options] INPUT\n\n"
+                  "Reads the model or scene document INPUT and writes it as OUTPUT. The extensions "
+                  "of the names\ntell the formats; .scene and .scene.json are scene documents.\n\n"
                   "Options of the program:\n";
     for (const HostOption& option : hostOptions) {
         string line(option.name);

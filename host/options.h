@@ -17,6 +17,7 @@ struct HostOptions {
     base::u32 verbose = 0;
     base::u32 strict = 0;
     base::u32 dryRun = 0;
+    base::u32 dump = 0;
     base::string logFile; ///< these three are empty for none
     base::string pluginFolder;
     base::string reportFile;

@@ -61,8 +61,8 @@ void checkFilesDiffer(const CommandLine& line, const string& sideFile) {
 string findSideFile(const CommandLine& line, const base::CmdLineOptions& registered) {
     const auto* embedded =
         dynamic_cast<const base::CmdLineValue<bool>*>(registered.find("-exportEmbedded"));
-    const string& output = line.files[1];
-    if (!embedded || !embedded->seen || embedded->values[0] ||
+    const string& output = line.files.back();
+    if (line.files.size() != 2 || !embedded || !embedded->seen || embedded->values[0] ||
         base::toLower(base::fs::extension(output)) != "gltf")
         return {};
     // The only buffer of a document has the number 0.

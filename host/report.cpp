@@ -108,6 +108,8 @@ void writeWritten(Writer& writer, const Output& written) {
         writer.EndObject();
     }
     writer.EndArray();
+    if (written.objects)
+        writeMember(writer, "objects", *written.objects);
     if (!written.document)
         return;
     const DocumentCounts& counts = *written.document;

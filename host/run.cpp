@@ -4,13 +4,16 @@
 #include "host/paths.h"
 #include "host/printing.h"
 #include "host/report.h"
+#include "host/scene_dump.h"
 #include "host/summary.h"
 
 #include "b_string_convert.h"
+#include "scene_document.h"
 #include "scene_options.h"
 #include "scene_schema.h"
 #include "stream/b_fs.h"
 
+#include <algorithm>
 #include <new>
 
 namespace host {
@@ -62,8 +65,8 @@ Run::Run(scene::SceneFactory& factory, const CommandLine& line,
          const base::CmdLineOptions& registered, const Messages& messages, StageClock clock)
     : factory_(factory), options_(line.host), registered_(registered), messages_(messages) {
     record_.input = line.files[0];
-    record_.output = line.files[1];
-    record_.isDryRun = options_.dryRun != 0;
+    record_.output = line.files.size() > 1 ? line.files[1] : string();
+    record_.isDryRun = options_.dryRun != 0 || options_.dump != 0;
     record_.clock = std::move(clock);
 }
 
@@ -87,7 +90,8 @@ ExitCode Run::execute() {
         base::log().log(base::logSystem, base::logError, e.texts[0]);
         record_.exitCode = judged(failure == ExitCode::done ? e.code : failure);
     }
-    if (record_.exitCode == ExitCode::done || record_.exitCode == ExitCode::strict)
+    if (!options_.dump &&
+        (record_.exitCode == ExitCode::done || record_.exitCode == ExitCode::strict))
         printSummary();
     return record_.exitCode;
 }
@@ -98,31 +102,44 @@ void Run::doStages() {
             [&] { checkInput(record_.input); });
     attempt(ExitCode::input, record_.input, listOf(factory_.getImporterExtensions()),
             [&] { prepareImport(); });
-    attempt(ExitCode::noExport, record_.output, listOf(factory_.getExporterExtensions()),
-            [&] { prepareExport(); });
-    checkOutput(record_.output);
+    if (!options_.dump) {
+        attempt(ExitCode::noExport, record_.output, listOf(factory_.getExporterExtensions()),
+                [&] { prepareExport(); });
+        checkOutput(record_.output);
+    }
     tellProgress(10, "Reading", record_.input);
     attempt(ExitCode::input, record_.input, "a model that can be read", [&] { importScene(); });
     applySceneOptions();
-    record_.unexported = findUnexported(factory_);
+    if (options_.dump) {
+        base::log().progressEnd();
+        print(stdout, sceneText(factory_));
+        return;
+    }
+    if (!scene::isSceneDocument(record_.output))
+        record_.unexported = findUnexported(factory_);
 
     record_.clock.begin("export");
     tellProgress(50, record_.isDryRun ? "Checking" : "Writing", record_.output);
     if (record_.isDryRun)
         attempt(ExitCode::input, record_.input, "a scene that can be checked",
                 [&] { record_.scene = checkScene(factory_, messages_); });
+    else if (scene::isSceneDocument(record_.output))
+        attempt(ExitCode::output, record_.output, "room and leave to write it",
+                [&] { storeScene(); });
     else
         attempt(ExitCode::noExport, record_.output, "a scene that can be exported",
                 [&] { exportScene(); });
 
     record_.clock.begin("report");
-    if (!record_.isDryRun)
+    if (!record_.isDryRun && !record_.written.objects)
         attempt(ExitCode::output, record_.output, "a whole file that can be read back",
                 [&] { readBack(); });
 }
 
 /// Finds the importer and its settings.
 void Run::prepareImport() {
+    if (scene::isSceneDocument(record_.input))
+        return;
     const CrashGuard guard(record_.input);
     AttribMap& settings = record_.settings.importer;
     if (!factory_.getImporterParameters(record_.input, settings))
@@ -134,6 +151,8 @@ void Run::prepareImport() {
 
 /// Finds the exporter and its settings.
 void Run::prepareExport() {
+    if (scene::isSceneDocument(record_.output))
+        return;
     AttribMap& settings = record_.settings.exporter;
     if (!factory_.getExporterParameters(record_.output, settings))
         throw base::exception("no plugin writes files of this kind");
@@ -143,6 +162,10 @@ void Run::prepareExport() {
 }
 
 void Run::importScene() {
+    if (scene::isSceneDocument(record_.input)) {
+        scene::readSceneDocument(factory_, record_.input);
+        return;
+    }
     const CrashGuard guard(record_.input);
     if (!factory_.load(factory_, record_.input, record_.settings.importer))
         throw Failure(ExitCode::input,
@@ -167,6 +190,20 @@ void Run::exportScene() {
         throw Failure(ExitCode::noExport,
                       record_.output + ": there is nothing to write, expected a scene with a root "
                                        "node in the input.");
+    checkFiles();
+}
+
+void Run::storeScene() {
+    const base::vector<string> files = scene::writeSceneDocument(factory_, record_.output);
+    checkFiles();
+    const auto isStored = [](const base::ref<base::IPlugin>& object) {
+        return object && !object->hasFlag(base::attribTransient);
+    };
+    record_.written = findOutput(
+        files, static_cast<base::u64>(std::ranges::count_if(factory_.plugins(), isStored)));
+}
+
+void Run::checkFiles() const {
     if (messages_.countFailedFiles() != 0)
         throw Failure(ExitCode::output,
                       record_.output + ": not all files could be written, expected room and leave "
@@ -201,7 +238,7 @@ void Run::printSummary() const {
         print(stdout, summaryLine(record_) + "\n");
 }
 
-/// The extensions of a list, with a dot in front of each.
+/// The extensions of a list and those of scene documents, with a dot in front of each.
 string Run::listOf(const string& extensions) const {
     string list;
     for (base::string_view entry : base::split(extensions, ';')) {
@@ -209,10 +246,12 @@ string Run::listOf(const string& extensions) const {
         if (!entry.empty())
             list.append(list.empty() ? "." : ", .").append(entry);
     }
-    return list.empty()
-               ? "a plugin for it in " + (options_.pluginFolder.empty() ? base::fs::moduleFolder()
-                                                                        : options_.pluginFolder)
-               : list;
+    if (list.empty())
+        return "a plugin for it in " +
+               (options_.pluginFolder.empty() ? base::fs::moduleFolder() : options_.pluginFolder);
+    for (const base::string_view extension : scene::sceneDocumentExtensions)
+        list.append(", .").append(extension);
+    return list;
 }
 
 } // namespace host

@@ -26,6 +26,8 @@ private:
     void importScene();
     void applySceneOptions();
     void exportScene();
+    void storeScene();
+    void checkFiles() const;
     void readBack();
     ExitCode judged(ExitCode failure) const;
     void writeReport();

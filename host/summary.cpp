@@ -3,6 +3,7 @@
 #include "host/printing.h"
 
 #include "b_format.h"
+#include "scene_document.h"
 #include "scene_options.h"
 
 #include <charconv>
@@ -29,9 +30,11 @@ string dryRunLine(const RunRecord& record) {
     using Schema = scene::sceneExporter_schema;
     const base::AttribMap& settings = record.settings.exporter;
     string line = record.output + ": would be written";
-    line += read(settings, Schema::n_exportEmbedded) ? " with its resources inside"
-                                                     : " with resources in files beside it";
-    line += read(settings, Schema::n_exportCompress) ? ", compressed" : ", not compressed";
+    if (!scene::isSceneDocument(record.output)) {
+        line += read(settings, Schema::n_exportEmbedded) ? " with its resources inside"
+                                                         : " with resources in files beside it";
+        line += read(settings, Schema::n_exportCompress) ? ", compressed" : ", not compressed";
+    }
     line += "; the scene has " + counted(record.scene.nodes, "node") + ", ";
     line += counted(record.scene.meshes, "mesh", "es");
     line += base::format(" ({} with faults), ", record.scene.faultyMeshes);
@@ -55,6 +58,8 @@ string writtenLine(const RunRecord& record) {
         return record.output + ": written, not counted as it is no regular file";
     string line = record.output + ": " + counted(record.written.files.size(), "file") + ", " +
                   counted(record.written.totalBytes(), "byte");
+    if (record.written.objects)
+        line += ", " + counted(*record.written.objects, "object");
     if (!record.written.document)
         return line;
     const DocumentCounts& counts = *record.written.document;

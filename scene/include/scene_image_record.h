@@ -36,8 +36,9 @@ SCENE_API void setPictureSource(base::AttribMap& texture, const base::string& pa
 /// Null for a texture that shows a file as it is.
 SCENE_API const base::string* findPictureSource(const base::AttribMap& texture);
 
-/// Tells, by a transient attribute, that the alpha of the picture of `texture` does not count where
-/// it is opaque everywhere: the format of its model reads no transparency from it.
+/// Tells, by an attribute that is stored with the scene, that the alpha of the picture of `texture`
+/// does not count where it is opaque everywhere: the format of its model reads no transparency from
+/// it.
 SCENE_API void setIgnoresOpaqueAlpha(base::AttribMap& texture);
 SCENE_API bool ignoresOpaqueAlpha(const base::AttribMap& texture);
 

@@ -106,7 +106,7 @@ base::u32 INode::getTransform(base::mat43& transform, const base::mat43* parentW
     bool repaired = false;
     transform = composeTransform(*this, repaired);
     const base::u32 faults = repaired ? faultNotFinite : 0;
-    if (read(*this, n_inheritsTransform))
+    if (scene::read(*this, n_inheritsTransform))
         return faults;
     base::mat43 undo, freed;
     if (!parentWorld || !invert(*parentWorld, undo) ||
@@ -117,7 +117,7 @@ base::u32 INode::getTransform(base::mat43& transform, const base::mat43* parentW
 }
 
 void INode::getTransform(base::mat43& transform) const {
-    INode* parent = read(*this, n_inheritsTransform) ? nullptr : findParent();
+    INode* parent = scene::read(*this, n_inheritsTransform) ? nullptr : findParent();
     base::mat43 parentWorld;
     if (parent)
         parent->getWorldTransform(parentWorld);
@@ -142,7 +142,7 @@ void INode::getWorldTransform(base::mat43& transform) const {
 
 void INode::setTransform(const base::mat43& transform) {
     base::mat43 own = transform;
-    if (INode* parent = read(*this, n_inheritsTransform) ? nullptr : findParent()) {
+    if (INode* parent = scene::read(*this, n_inheritsTransform) ? nullptr : findParent()) {
         base::mat43 parentWorld;
         parent->getWorldTransform(parentWorld);
         own = multiply(parentWorld, transform);

@@ -79,8 +79,9 @@ void IBufferAdapter::refresh() {
         return;
     }
     const std::size_t size = data->size();
-    const std::size_t offset = std::min<std::size_t>(read(*this, n_inputOffset), size);
-    const std::size_t length = std::min<std::size_t>(read(*this, n_inputLength), size - offset);
+    const std::size_t offset = std::min<std::size_t>(scene::read(*this, n_inputOffset), size);
+    const std::size_t length =
+        std::min<std::size_t>(scene::read(*this, n_inputLength), size - offset);
     // The length counts from the start of the data, whatever the offset.
     const ByteRange bytes{data->data() + offset, length > offset ? length - offset : 0};
     viewAll(*this, &bytes);

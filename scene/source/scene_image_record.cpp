@@ -90,9 +90,7 @@ const base::string* findPictureSource(const AttribMap& texture) {
 }
 
 void setIgnoresOpaqueAlpha(AttribMap& texture) {
-    const name_id name = names().ignoresOpaqueAlpha;
-    texture.attribute<bool>(name) = true;
-    makeTransient(*texture.findAttribute(name));
+    texture.attribute<bool>(names().ignoresOpaqueAlpha) = true;
 }
 
 bool ignoresOpaqueAlpha(const AttribMap& texture) {

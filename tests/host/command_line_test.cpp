@@ -102,10 +102,11 @@ TEST_F(CommandLineTest, TakesUnusualValues) {
 }
 
 TEST_F(CommandLineTest, TellsFormatsAndVersions) {
-    EXPECT_EQ(run({"--formats"}).out, "input: script\noutput: out Result|words\n");
+    EXPECT_EQ(run({"--formats"}).out, "input: script scene scene.json\n"
+                                      "output: out Result|words scene scene.json\n");
     const Outcome real = runReal({"--formats"});
     EXPECT_NE(real.out.find(" obj "), std::string::npos) << real.out;
-    EXPECT_TRUE(real.out.ends_with("\noutput: gltf glb\n")) << real.out;
+    EXPECT_TRUE(real.out.ends_with("\noutput: gltf glb scene scene.json\n")) << real.out;
     const Outcome version = run({"--version"});
     EXPECT_EQ(version.exitCode, 0);
     EXPECT_TRUE(version.out.starts_with("scene_export " PROGRAM_VERSION "\n")) << version.out;

@@ -102,7 +102,14 @@ TEST_F(ExamplesTest, ImporterReadsTriangles) {
 }
 
 TEST_F(ExamplesTest, TextsShowTheExamples) {
-    for (const char* shown : {"README.md", "docs/writing_plugins.md"}) {
+    const struct {
+        const char* text;
+        const char* language;
+        std::size_t listings;
+    } rows[] = {{"README.md", "cpp", 1},
+                {"docs/scene-document.md", "json", 11},
+                {"docs/writing_plugins.md", "cpp", 1}};
+    for (const auto& [shown, language, listings] : rows) {
         const std::filesystem::path source = SOURCE_FOLDER;
         const std::string text = readFile(source / shown);
         std::size_t blocks = 0;
@@ -111,11 +118,12 @@ TEST_F(ExamplesTest, TextsShowTheExamples) {
         for (std::size_t at = text.find(mark); at != std::string::npos; at = text.find(mark, at)) {
             at += mark.size();
             const std::string name = text.substr(at, text.find(' ', at) - at);
-            const std::string listing = " -->\n```cpp\n" + readFile(source / name) + "```\n";
+            const std::string listing =
+                std::string(" -->\n```") + language + "\n" + readFile(source / name) + "```\n";
             EXPECT_EQ(text.substr(at + name.size(), listing.size()), listing) << shown << name;
             ++blocks;
         }
-        EXPECT_EQ(blocks, 1u) << shown;
+        EXPECT_EQ(blocks, listings) << shown;
     }
 }
 

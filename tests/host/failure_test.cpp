@@ -29,9 +29,10 @@ TEST_F(FailureTest, InputsThatCannotBeRead) {
         {"@/missing.script", "@/missing.script: File '@/missing.script' cannot be found, expected"},
         {"@/folder.script", "@/folder.script: is no regular file"},
         {"@/pipe.script", "@/pipe.script: is no regular file"},
-        {"@/a.unknown", "@/a.unknown: no plugin reads files of this kind, expected .script."},
-        {"@/none",
-         "@/none: mesh factory: Can't load meshes without an extension, expected .script."},
+        {"@/a.unknown",
+         "@/a.unknown: no plugin reads files of this kind, expected .script, .scene, .scene.json."},
+        {"@/none", "@/none: mesh factory: Can't load meshes without an extension, expected "
+                   ".script, .scene, .scene.json."},
         {"@/a.script", "@/a.script: could not be read"}};
     for (const auto& row : rows)
         expectFailure(run({row.input, "@/old.out"}), 2, row.error);
@@ -75,7 +76,7 @@ TEST_F(FailureTest, OutputsThatCannotBeMade) {
         const char* error;
     } rows[] = {
         {{"@/a.obj", "@/a.foo"}, 3, "@/a.foo: no plugin writes files of this kind, expected .gltf"},
-        {{"@/a.obj", "@/a"}, 3, "without an extension, expected .gltf, .glb."},
+        {{"@/a.obj", "@/a"}, 3, "without an extension, expected .gltf, .glb, .scene, .scene.json."},
         {{"@/a.obj", "@/o.gltf", "-exportEmbedded", "no", "--report", "@/o0.bin"},
          1,
          "the report and the buffer of OUTPUT are"},

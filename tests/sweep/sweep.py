@@ -4,8 +4,9 @@
 Each model is exported as .glb, as .gltf with everything inside and as .gltf with side files, each
 with and without compression. The results are read by a reader of their own (gltf_stats), and
 triangles, surface area, volume and bounds are compared with the source (model_stats). The first
-form is exported twice and must come out with the same bytes; its vertices are compared with those
-of the source at ten times of its animation (pose_check). With --tools, the commands gltf-validate,
+form is exported twice and must come out with the same bytes, also by way of a scene document in
+either form; its vertices are compared with those of the source at ten times of its animation
+(pose_check). Scene documents among the models have no source to be compared with. With --tools, the commands gltf-validate,
 gltf-dump and gltf-render, if you have them, look at the results as well.
 
 Prints one line for each model and form, and a summary. Exit code: 0 no fault, 1 faults, 2 wrong
@@ -23,7 +24,8 @@ import sys
 from concurrent.futures import ThreadPoolExecutor
 from dataclasses import dataclass, field
 
-EXTENSIONS = {".obj", ".fbx", ".dae", ".ply", ".3ds", ".stl"}
+DOCUMENT = ".scene.json"
+EXTENSIONS = (".obj", ".fbx", ".dae", ".ply", ".3ds", ".stl", DOCUMENT)
 PROCESSES = 2
 TIMEOUT = 900  # seconds for one process
 BATCH = 200  # files for one process
@@ -115,8 +117,9 @@ class Sweep:
 
     def check_model(self, model, folder):
         """Exports a model in all forms and compares each with the source."""
-        source, reason = self.read_stats("model_stats", model)
-        if source is None:
+        is_document = model.name.endswith(DOCUMENT)
+        source, reason = (None, "") if is_document else self.read_stats("model_stats", model)
+        if source is None and not is_document:
             return [self.check_refusal(model, folder, reason)]
         results = []
         for form in FORMS:
@@ -130,11 +133,14 @@ class Sweep:
                 continue
             for fault in result.stats["faults"]:
                 result.report("reader", f"{fault['kind']} {fault['text']}")
-            for text in compare(source, result.stats):
+            for text in compare(source, result.stats) if source else ():
                 result.report("compare", text)
         if not results[0].faults:
-            self.check_pose(results[0])
+            if source:
+                self.check_pose(results[0])
             self.check_repetition(results[0], folder)
+            for extension in ("scene", "scene.json"):
+                self.check_document(results[0], folder / extension, extension)
         return results
 
     def check_pose(self, result):
@@ -178,6 +184,28 @@ class Sweep:
         if not again.faults and again.output.read_bytes() != first.output.read_bytes():
             first.report("export", "a second export gives other bytes")
         shutil.rmtree(again.output.parent)
+
+    def check_document(self, first, folder, extension):
+        """Stored twice and exported from there, the scene must come out with the same bytes."""
+        shutil.rmtree(folder, ignore_errors=True)
+        folder.mkdir(parents=True)
+        stored = [folder / f"{name}.{extension}" for name in ("first", "again")]
+        output = folder / first.output.name
+        for command in (
+            (first.model, stored[0]),
+            (first.model, stored[1]),
+            (*first.form.options, stored[0], output),
+        ):
+            done = self.run(self.export, *command)
+            if done.returncode != 0:
+                first.report(extension, f"exit code {done.returncode}: {last_line(done.stderr)}")
+                return
+        texts = [path.read_bytes().replace(b"again.", b"first.") for path in stored]
+        if texts[0] != texts[1]:
+            first.report(extension, "stored a second time it has other bytes")
+        if output.read_bytes() != first.output.read_bytes():
+            first.report(extension, "exported from there it has other bytes")
+        shutil.rmtree(folder)
 
     # The commands.
 
@@ -333,7 +361,7 @@ def find_models(arguments, out):
     models = []
     for argument in arguments:
         if argument.is_dir():
-            found = sorted(p for p in argument.rglob("*") if p.suffix.lower() in EXTENSIONS)
+            found = sorted(p for p in argument.rglob("*") if p.name.lower().endswith(EXTENSIONS))
             models += [(p, p.relative_to(argument)) for p in found if p.is_file()]
         elif argument.is_file():
             models.append((argument, pathlib.Path(argument.name)))

@@ -95,7 +95,7 @@ public:
         const std::size_t end = text.find("---\n");
         const base::ref<base::IPlugin> document = scene.create(scene::scene_schema::n_kind);
         const base::ref<base::IPlugin> root = scene.create(scene::node_schema::n_kind);
-        write(*document, scene::scene_schema::n_root) = root;
+        scene::write(*document, scene::scene_schema::n_root) = root;
         scene.attributes().attribute<string>(nameOf("payload")) =
             end == string::npos ? "" : text.substr(end + 4);
         const string commands = text.substr(0, end);
@@ -118,7 +118,8 @@ private:
         else if (command == "log")
             base::log().log(base::logScene, argument[0] - '0', argument.substr(2));
         else if (command == "object")
-            write(*scene.create(nameOf(argument)), scene::node_schema::n_name) = "The " + argument;
+            scene::write(*scene.create(nameOf(argument)), scene::node_schema::n_name) =
+                "The " + argument;
         else if (command == "mesh")
             addMesh(scene, argument == "broken" ? 9 : 1, root);
         else if (command == "image")
