@@ -157,6 +157,7 @@ private:
     void end(char bracket);
     void separate();
     void newLine();
+    bool isLineFull() const;
     void flush();
     void require(std::size_t byteCount) {
         if (static_cast<std::size_t>(blockEnd_ - at_) < byteCount)

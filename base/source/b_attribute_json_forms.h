@@ -28,7 +28,7 @@ private:
 };
 
 /// Begins an object that tells its type and flags; its value, and `endObject`, are to follow.
-void beginTyped(DataWriter& out, name_id type, u32 flags);
+void beginTyped(DataWriter& out, name_id type, u32 flags, DataLayout layout);
 /// Writes the member for the stored flags, unless they are 0.
 void writeFlags(DataWriter& out, u32 flags);
 /// Writes the attributes of `map` as members of the open object.

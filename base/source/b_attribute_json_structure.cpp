@@ -276,8 +276,8 @@ string_view validText(name_id name, const JSONWriteOptions& options, string& rep
     return repaired = toValidUtf8(name.view());
 }
 
-void beginTyped(DataWriter& out, name_id type, u32 flags) {
-    out.beginObject();
+void beginTyped(DataWriter& out, name_id type, u32 flags, DataLayout layout) {
+    out.beginObject(layout);
     out.name("@type");
     out.text(type.view());
     writeFlags(out, flags);
@@ -294,7 +294,7 @@ void AttribMap::writeJson(DataWriter& out, JSONWriteOptions& options) const {
     const NestedValue nested(options.depth);
     const bool isTyped = (flags() & storedFlags) != 0;
     if (isTyped) {
-        beginTyped(out, n_map, flags());
+        beginTyped(out, n_map, flags(), DataLayout::lines);
         out.name("@value");
     }
     out.beginObject();
@@ -336,7 +336,7 @@ void AttribArray::writeJson(DataWriter& out, JSONWriteOptions& options) const {
     const bool tellsType = !isSameType(typeName_, impliedTypeName(*this));
     const bool isTyped = tellsType || (flags() & storedFlags) != 0;
     if (isTyped)
-        beginTyped(out, n_array, flags());
+        beginTyped(out, n_array, flags(), DataLayout::lines);
     if (tellsType) {
         string repaired;
         out.name("@of");
@@ -350,7 +350,7 @@ void AttribArray::writeJson(DataWriter& out, JSONWriteOptions& options) const {
 }
 
 void AttribLink::writeJson(DataWriter& out, JSONWriteOptions& options) const {
-    beginTyped(out, n_link, flags());
+    beginTyped(out, n_link, flags(), DataLayout::lines);
     out.name("@value");
     out.beginArray();
     const IPlugin* root = path_.root();

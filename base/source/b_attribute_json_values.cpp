@@ -144,8 +144,7 @@ bool readValue(T& value, DataReader& in, const JSONReadOptions& options) {
 
 template <class T>
 void writeElements(const vector<T>& values, DataWriter& out, const JSONWriteOptions& options) {
-    constexpr bool isText = std::is_same_v<T, string> || std::is_same_v<T, ref<IPlugin>>;
-    out.beginArray(isText ? DataLayout::lines : DataLayout::flow);
+    out.beginArray(DataLayout::flow);
     if constexpr (std::is_same_v<T, string>) {
         for (const string& value : values)
             writeText(value, out);
@@ -199,7 +198,7 @@ void TypedAttribute<T>::writeJson(DataWriter& out, JSONWriteOptions& options) co
         writeValue(value_, out, options);
         return;
     }
-    beginTyped(out, type(), flags());
+    beginTyped(out, type(), flags(), DataLayout::flow);
     out.name("@value");
     writeValue(value_, out, options);
     out.endObject();
@@ -221,7 +220,7 @@ bool TypedAttribute<T>::readJson(DataReader& in, JSONReadOptions& options) {
 
 template <class T>
 void TypedVectorAttribute<T>::writeJson(DataWriter& out, JSONWriteOptions& options) const {
-    beginTyped(out, type(), flags());
+    beginTyped(out, type(), flags(), DataLayout::flow);
     out.name("@value");
     writeElements(value_, out, options);
     out.endObject();

@@ -12,7 +12,7 @@ namespace base {
 namespace {
 
 constexpr std::size_t blockSize = 256 * 1024;
-constexpr std::size_t lineLength = 100; ///< a line of numbers ends with the first beyond it
+constexpr i64 lineLength = 100;         ///< a line that flows ends with the first value beyond it
 constexpr std::size_t numberRoom = 32;  ///< for the text of any number
 constexpr std::size_t indentation = 2;
 
@@ -105,6 +105,10 @@ void JSONAttrWriter::newLine() {
     }
 }
 
+bool JSONAttrWriter::isLineFull() const {
+    return at_ - block_.get() - lineStart_ >= lineLength;
+}
+
 /// What stands between the values of a container, ahead of the next one.
 void JSONAttrWriter::separate() {
     if (std::exchange(hasName_, false) || levels_.empty())
@@ -113,7 +117,7 @@ void JSONAttrWriter::separate() {
     const bool isFirst = std::exchange(level.isEmpty, false);
     if (!isFirst)
         put(",");
-    if (level.layout == DataLayout::lines)
+    if (level.layout == DataLayout::lines || (!isFirst && isLineFull()))
         newLine();
     else if (!isFirst)
         put(" ");
@@ -218,7 +222,7 @@ void JSONAttrWriter::putNumbers(const T* values, std::size_t count) {
         if (!std::exchange(levels_.back().isEmpty, false)) {
             require(2);
             *at_++ = ',';
-            if (at_ - block_.get() - lineStart_ < static_cast<i64>(lineLength))
+            if (!isLineFull())
                 *at_++ = ' ';
             else
                 newLine();
