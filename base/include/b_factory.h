@@ -13,6 +13,7 @@ class AttribPath;
 class CmdLineOptions;
 class IPlugin;
 class PluginFactory;
+class StoredDocument;
 class Stream;
 
 /// A mix-in that an object exposes by name.
@@ -234,7 +235,8 @@ public:
     void write(Stream& stream) const;
     /// Reads the binary form from the stream's position. Throws `exception` for a file of another
     /// kind or version and, with `streamThrowOnShortRead`, for one that is cut. False if the list
-    /// of objects is broken; the log tells where.
+    /// of objects is broken, which the log tells, or if, without that flag, the data ends before
+    /// the objects.
     bool read(Stream& stream);
     /// Writes the JSON form; the same scene gives the same text in every process.
     void writeJson(Stream& stream) const;
@@ -257,6 +259,7 @@ private:
     template <class Redirect>
     void redirectReferences(Redirect redirect);
     void append(const ref<IPlugin>& plugin);
+    void readDocument(StoredDocument& document, i32 version);
     void enlist(IPlugin& object);
     void delist(IPlugin& object);
 

@@ -5,6 +5,7 @@
 #include "b_factory.h"
 #include "b_format.h"
 #include "b_log.h"
+#include "b_stored_document.h"
 #include "stream/b_stream_workers.h"
 
 #include <optional>
@@ -33,25 +34,6 @@ constexpr u64 smallestObjectBytes = 9;
 [[noreturn]] void throwDocument(string text, const char* function) {
     throw exception(std::move(text), "b_factory", function, __LINE__);
 }
-
-/// Reports how far a list is, as often as the percentage changes, and the end when it dies.
-class Progress : public NonCopyable {
-public:
-    Progress(const char* text, std::size_t count) : text_(text), count_(count) {}
-    ~Progress() { log().progressEnd(); }
-    void at(std::size_t index) {
-        const u32 percent = static_cast<u32>(u64{index} * 100 / count_);
-        if (percent == percent_)
-            return;
-        percent_ = percent;
-        log().progress(percent, text_);
-    }
-
-private:
-    const char* text_;
-    std::size_t count_;
-    u32 percent_ = 101; ///< the last that was reported
-};
 
 /// Makes room in a stream that grows, which would otherwise move its content again and again, and
 /// gives back what was not written.
@@ -106,7 +88,7 @@ public:
         attributes_.write(stream, options);
         writeList(out);
 
-        Progress progress("Writing plugins", factory_.pluginCount());
+        ListProgress progress(writingPlugins, factory_.pluginCount());
         for (std::size_t i = 0, stored = 0; i < factory_.plugins().size(); ++i) {
             progress.at(i);
             const ref<IPlugin>& object = factory_.plugins()[i];
@@ -204,7 +186,7 @@ private:
 };
 
 /// Reads up to the objects before it touches the factory.
-class DocumentReader {
+class DocumentReader final : public StoredDocument {
 public:
     DocumentReader(PluginFactory& factory, Stream& stream)
         : factory_(factory), stream_(stream), options_{&factory, factory.pluginCount()},
@@ -212,7 +194,7 @@ public:
         in_.state().attributeFactory = &factory.attributeFactory();
     }
 
-    u32 objectCount() const { return static_cast<u32>(records_.size()); }
+    u32 objectCount() const override { return static_cast<u32>(records_.size()); }
 
     /// All that stands before the objects. False if it ends early or the list is broken.
     bool readHead() {
@@ -220,21 +202,17 @@ public:
                readAttributeBytes() && readList();
     }
 
-    /// Makes all objects at once, so that references find theirs whatever their order. Their places
-    /// have to be in the factory's list, empty.
-    void createObjects() {
+    void createObjects() override {
         for (const ObjectRecord& record : std::as_const(records_)) {
             if (record.type == noType)
                 continue;
             const name_id type = std::as_const(types_)[record.type];
-            if (!factory_.hasDesc(type))
-                registerDummy(type);
-            factory_.createAt(type, options_.firstId + record.id);
+            createStored(factory_, type, options_.firstId + record.id);
         }
     }
 
-    void readObjects() {
-        Progress progress("Reading plugins", records_.size());
+    void readObjects() override {
+        ListProgress progress(readingPlugins, records_.size());
         for (const ObjectRecord& record : std::as_const(records_)) {
             progress.at(record.id);
             if (record.type == noType)
@@ -247,14 +225,15 @@ public:
         }
     }
 
-    /// The document's own attributes; references in them need the objects.
-    void readAttributes(AttribMap& attributes) {
+    std::unique_ptr<AttribMap> readAttributes() override {
         Stream stream = memStreamView(std::as_const(attributeBytes_).data(), attributeBytes_.size(),
                                       stream_.name());
         stream.setFlags(stream_.flags());
         in_.state().left = attributeBytes_.size();
         in_.state().canSeek = true;
-        attributes.read(stream, options_);
+        auto read = std::make_unique<AttribMap>(factory_.attributeFactory());
+        read->read(stream, options_);
+        return read;
     }
 
 private:
@@ -344,14 +323,6 @@ private:
         return in_.has(objects * smallestObjectBytes);
     }
 
-    void registerDummy(name_id type) {
-        log().log(logSystem, logWarning,
-                  "plugin factory| Unsupported plugin type {}! Objects of this type will have "
-                  "limited functionality.",
-                  type);
-        factory_.create(type, createLoose); // which the list does without
-    }
-
     [[noreturn]] static void throwReading(string text) {
         throwDocument(std::move(text), "base::PluginFactory::read");
     }
@@ -389,36 +360,9 @@ bool PluginFactory::read(Stream& source) {
     if (!document.readHead())
         return false;
 
-    const u32 firstId = pluginCount();
-    std::unique_ptr<Attribute> attributesBefore;
-    try {
-        plugins_.resize(firstId + document.objectCount());
-        document.createObjects();
-        document.readObjects();
-        if (canSeek)
-            source.setPosition(static_cast<i64>(stream.position()));
-
-        AttribMap read(*attribFactory_);
-        document.readAttributes(read);
-        attributesBefore.reset(attributes_.clone());
-        attributes_.setFlags((attributes_.flags() & ~u32{0xff}) | read.flags());
-        attributes_.assign(read, assignAdopt);
-        afterLoadAll(static_cast<i32>(factoryVersion), firstId);
-    } catch (...) {
-        if (attributesBefore) {
-            attributes_.clear();
-            attributes_.assign(*attributesBefore, assignAdopt);
-            attributes_.setFlags(attributesBefore->flags());
-        }
-        for (u32 id = firstId; id < pluginCount(); ++id) {
-            if (const ref<IPlugin> object = plugin(id)) {
-                object->clear(); // their references to each other
-                remove(id, true);
-            }
-        }
-        plugins_.resize(firstId);
-        throw;
-    }
+    readDocument(document, static_cast<i32>(factoryVersion));
+    if (canSeek)
+        source.setPosition(static_cast<i64>(stream.position()));
     return true;
 }
 

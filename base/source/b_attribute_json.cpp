@@ -1,5 +1,6 @@
 #include "b_attribute_json_forms.h"
 #include "b_log.h"
+#include "b_stored_document.h"
 
 namespace base {
 
@@ -10,23 +11,6 @@ constexpr string_view documentOwner = "document"; // in messages
 constexpr string_view versionMember = "@version";
 constexpr string_view attributesMember = "@attributes";
 constexpr string_view objectsMember = "@objects";
-
-/// Reports how far a list is, as often as the percentage changes, and the end when it dies.
-class Progress : public NonCopyable {
-public:
-    Progress(string_view text, std::size_t count) : text_(text), count_(count) {}
-    ~Progress() { log().progressEnd(); }
-    void at(std::size_t index) {
-        const u32 percent = static_cast<u32>(u64{index} * 100 / count_);
-        if (percent != std::exchange(percent_, percent))
-            log().progress(percent, text_);
-    }
-
-private:
-    string_view text_;
-    std::size_t count_;
-    u32 percent_ = 101; ///< the last that was reported
-};
 
 /// Names that a single one of the objects has.
 hash_map<string_view, u32> uniqueNames(const PluginFactory& factory,
@@ -63,15 +47,8 @@ void writeObject(const IPlugin& object, DataWriter& out, JSONWriteOptions& optio
     out.endObject();
 }
 
-/// Takes over what a reader made of the document's attributes.
-void addAttributes(AttribMap& target, const Attribute& read) {
-    target.assign(read, assignAdopt);
-    target.setFlags((target.flags() & ~storedFlags) | (read.flags() & storedFlags));
-    target.setTypeName(read.asMap()->typeName());
-}
-
 /// The members of a document, and its objects once they are made.
-class DocumentReader {
+class DocumentReader final : public StoredDocument {
 public:
     DocumentReader(PluginFactory& factory, DataReader& in) : factory_(factory), in_(in) {
         options_.attribFactory = &factory.attributeFactory();
@@ -79,7 +56,7 @@ public:
         options_.owner = documentOwner;
     }
 
-    u32 objectCount() const { return static_cast<u32>(options_.objects.size()); }
+    u32 objectCount() const override { return static_cast<u32>(options_.objects.size()); }
 
     /// The parts of the document. False, with a message, if it is none.
     bool readHead() {
@@ -97,9 +74,7 @@ public:
                findObjects(placeOf(members, objectsMember));
     }
 
-    /// Makes all objects at once, so that references find theirs whatever their order. Their places
-    /// have to be in the factory's list, empty.
-    void createObjects() {
+    void createObjects() override {
         for (u32 place = 0; place < objectCount(); ++place) {
             in_.setPlace(std::as_const(places_)[place]);
             if (in_.kind() == DataKind::null)
@@ -113,8 +88,8 @@ public:
         }
     }
 
-    void readObjects() {
-        Progress progress("Reading plugins", objectCount());
+    void readObjects() override {
+        ListProgress progress(readingPlugins, objectCount());
         for (u32 place = 0; place < objectCount(); ++place) {
             progress.at(place);
             if (const ref<IPlugin> object = std::as_const(options_.objects)[place]) {
@@ -124,8 +99,7 @@ public:
         }
     }
 
-    /// The document's own attributes; null if there are none.
-    std::unique_ptr<Attribute> readAttributes() {
+    std::unique_ptr<AttribMap> readAttributes() override {
         if (attributes_ == noPlace)
             return nullptr;
         in_.setPlace(attributes_);
@@ -135,7 +109,7 @@ public:
         if (in_.kind() == DataKind::object)
             read.reset(readJsonAttribute(in_, options_));
         if (read && read->asMap())
-            return read;
+            return std::unique_ptr<AttribMap>(read.release()->asMap());
         in_.setPlace(attributes_);
         logUnreadable(in_, options_, n_map.view());
         return nullptr;
@@ -216,22 +190,12 @@ private:
             return;
         }
         const name_id type = validName(typeText);
-        if (!factory_.hasDesc(type))
-            registerDummy(type);
-        options_.objects[place] = factory_.createAt(type, options_.firstId + place);
+        options_.objects[place] = createStored(factory_, type, options_.firstId + place);
         if (name.empty())
             return;
         const auto [at, isNew] = options_.placeOfName.emplace(name, place);
         if (!isNew)
             at->second |= JSONReadOptions::severalObjects;
-    }
-
-    void registerDummy(name_id type) {
-        log().log(logSystem, logWarning,
-                  "plugin factory| Unsupported plugin type {}! Objects of this type will have "
-                  "limited functionality.",
-                  type);
-        factory_.create(type, createLoose); // which the list does without
     }
 
     void readObject(IPlugin& object) {
@@ -276,7 +240,7 @@ void PluginFactory::writeJson(Stream& stream) const {
         attributes_.writeJson(out, options);
     }
 
-    Progress progress("Writing plugins", plugins_.size());
+    ListProgress progress(writingPlugins, plugins_.size());
     out.name(objectsMember);
     out.beginArray();
     for (std::size_t i = 0; i < plugins_.size(); ++i) {
@@ -300,31 +264,7 @@ bool PluginFactory::readJson(Stream& stream) {
     if (!document.readHead())
         return false;
 
-    const u32 firstId = pluginCount();
-    std::unique_ptr<Attribute> attributesBefore;
-    try {
-        plugins_.resize(firstId + document.objectCount());
-        document.createObjects();
-        document.readObjects();
-        if (const std::unique_ptr<Attribute> read = document.readAttributes()) {
-            attributesBefore.reset(attributes_.clone());
-            addAttributes(attributes_, *read);
-        }
-        afterLoadAll(documentVersion, firstId);
-    } catch (...) {
-        if (attributesBefore) {
-            attributes_.clear();
-            addAttributes(attributes_, *attributesBefore);
-        }
-        for (u32 id = firstId; id < pluginCount(); ++id) {
-            if (const ref<IPlugin> object = plugin(id)) {
-                object->clear(); // their references to each other
-                remove(id, true);
-            }
-        }
-        plugins_.resize(firstId);
-        throw;
-    }
+    readDocument(document, documentVersion);
     return true;
 }
 

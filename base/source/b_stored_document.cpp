@@ -1,0 +1,58 @@
+#include "b_stored_document.h"
+
+namespace base {
+
+namespace {
+
+/// Takes over attributes, the stored flags and the type, if there is one.
+void addAttributes(AttribMap& target, const AttribMap& read) {
+    constexpr u32 storedFlags = 0xff;
+    target.assign(read, assignAdopt);
+    target.setFlags((target.flags() & ~storedFlags) | (read.flags() & storedFlags));
+    if (!read.typeName().isEmpty())
+        target.setTypeName(read.typeName());
+}
+
+} // namespace
+
+ref<IPlugin> createStored(PluginFactory& factory, name_id type, u32 id) {
+    if (!factory.hasDesc(type)) {
+        log().log(logSystem, logWarning,
+                  "plugin factory| Unsupported plugin type {}! Objects of this type will have "
+                  "limited functionality.",
+                  type);
+        factory.create(type, createLoose); // makes the description; the list does without
+    }
+    return factory.createAt(type, id);
+}
+
+void PluginFactory::readDocument(StoredDocument& document, i32 version) {
+    const u32 firstId = pluginCount();
+    std::unique_ptr<Attribute> attributesBefore;
+    try {
+        plugins_.resize(firstId + document.objectCount());
+        document.createObjects();
+        document.readObjects();
+        if (const std::unique_ptr<AttribMap> read = document.readAttributes()) {
+            attributesBefore.reset(attributes_.clone());
+            addAttributes(attributes_, *read);
+        }
+        afterLoadAll(version, firstId);
+    } catch (...) {
+        if (attributesBefore) {
+            attributes_.clear();
+            attributes_.setTypeName({});
+            addAttributes(attributes_, *attributesBefore->asMap());
+        }
+        for (u32 id = firstId; id < pluginCount(); ++id) {
+            if (const ref<IPlugin> object = plugin(id)) {
+                object->clear(); // their references to each other
+                remove(id, true);
+            }
+        }
+        plugins_.resize(firstId);
+        throw;
+    }
+}
+
+} // namespace base
