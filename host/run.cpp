@@ -66,7 +66,7 @@ Run::Run(scene::SceneFactory& factory, const CommandLine& line,
     : factory_(factory), options_(line.host), registered_(registered), messages_(messages) {
     record_.input = line.files[0];
     record_.output = line.files.size() > 1 ? line.files[1] : string();
-    record_.isDryRun = options_.dryRun != 0 || options_.dump != 0;
+    record_.isDryRun = options_.dryRun != 0;
     record_.clock = std::move(clock);
 }
 

@@ -126,7 +126,8 @@ protected:
     virtual bool readNumbers(NumberType type, void* values, std::size_t count) = 0;
 };
 
-/// Writes indented JSON to a stream, in blocks. NaN and infinite numbers are written as NaN,
+/// Writes indented JSON to a stream, in blocks; throws `exception` for a text that is longer than
+/// the 1 GiB that a reader takes. NaN and infinite numbers are written as NaN,
 /// Infinity and -Infinity.
 class BASE1_API JSONAttrWriter final : public DataWriter {
 public:
@@ -175,6 +176,7 @@ private:
     char* at_;
     char* blockEnd_;
     i64 lineStart_ = 0; ///< of the line being written, as an offset from the block's start
+    u64 written_ = 0;   ///< bytes in front of the block
 };
 
 /// Reads a whole text at `open` and walks over it.
@@ -212,8 +214,8 @@ private:
 struct JSONWriteOptions {
     /// Objects of another factory can't be referred to. Null: of any, by their ids.
     const PluginFactory* factory = nullptr;
-    /// Names that a single object of the factory has, with its id: these stand for it.
-    hash_map<string_view, u32> idOfName;
+    /// By the object's id: the name that it alone has and that stands for it, null without one.
+    vector<const string*> uniqueNames;
     // For messages: the object that is being written, and its attribute.
     string owner;
     name_id attribute;

@@ -74,7 +74,8 @@ public:
 
     /// At least what `write` will write.
     u64 byteCount() const {
-        u64 total = payloadBytes_ + 256 + factory_.pluginCount() * u64{16};
+        u64 total = payloadBytes_ + attributes_.typeName().view().size() + 256 +
+                    factory_.pluginCount() * u64{16};
         if (names_)
             total += textBytes(names_->names());
         return total + textBytes(state_.attributeTypes.names()) + textBytes(types_.names());
@@ -84,6 +85,7 @@ public:
         BinaryWriteOptions options{&factory_, &state_};
         BinaryWriter out(stream, options);
         writeHead(out);
+        out.text(attributes_.typeName().view());
         out.number(attributeBytes_);
         attributes_.write(stream, options);
         writeList(out);
@@ -199,7 +201,7 @@ public:
     /// All that stands before the objects. False if it ends early or the list is broken.
     bool readHead() {
         return readVersions() && readAttributeTypes() && readTexts(types_, true) &&
-               readAttributeBytes() && readList();
+               in_.text(attributesType_) && readAttributeBytes() && readList();
     }
 
     void createObjects() override {
@@ -233,6 +235,8 @@ public:
         in_.state().canSeek = true;
         auto read = std::make_unique<AttribMap>(factory_.attributeFactory());
         read->read(stream, options_);
+        if (!attributesType_.empty())
+            read->setTypeName(nameServer().id(attributesType_));
         return read;
     }
 
@@ -332,6 +336,7 @@ private:
     BinaryReadOptions options_;
     BinaryReader in_;
     vector<name_id> types_; ///< of the objects
+    string attributesType_;
     vector<u8> attributeBytes_;
     vector<ObjectRecord> records_;
 };

@@ -4,6 +4,7 @@
 #include "b_exception.h"
 #include "b_factory.h"
 #include "b_log.h"
+#include "b_stored_document.h"
 
 namespace base {
 
@@ -133,12 +134,6 @@ name_id ownName(const PathStep& step) {
     return step.name.isEmpty() ? name_id() : step.name;
 }
 
-/// The root's id in the document that is read into. One that is none stays.
-u32 shiftedRoot(u32 storedId, u32 firstId) {
-    const u64 id = u64{storedId} + firstId;
-    return storedId == IPlugin::noId || id >= IPlugin::noId ? IPlugin::noId : static_cast<u32>(id);
-}
-
 } // namespace
 
 void AttribLink::write(Stream& stream, BinaryWriteOptions& options) const {
@@ -174,7 +169,7 @@ bool AttribLink::read(Stream& stream, BinaryReadOptions& options) {
         }
         const bool isRoot = step.kind == PathStepKind::plugin;
         path.step(step.kind, ownName(step),
-                  isRoot ? shiftedRoot(step.index, options.firstId) : step.index);
+                  isRoot ? shiftedId(step.index, options.firstId) : step.index);
     }
     if (count != 0 && path.steps()[0].kind == PathStepKind::plugin && options.factory)
         if (const ref<IPlugin> root = options.factory->plugin(path.steps()[0].index))
@@ -205,7 +200,9 @@ bool AttribArray::read(Stream& stream, BinaryReadOptions& options) {
     typeName_ = typeName.isEmpty() ? name_id() : typeName;
     for (u32 i = 0; i < count; ++i) {
         name_id storedType;
-        if (!in.name(storedType) || !storedType)
+        if (!in.name(storedType))
+            return false;
+        if (!storedType)
             throw exception("array attribute: Unable to read the attribute type inside! Probably a "
                             "corrupted file!",
                             "b_attribute", "base::AttribArray::read", __LINE__);

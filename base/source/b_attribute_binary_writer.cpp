@@ -142,7 +142,7 @@ u16 BinaryNameTable::id(name_id name) const {
 }
 
 u32 BinaryTypeTable::add(name_id name) {
-    const auto [at, isNew] = ids_.emplace(name, static_cast<u32>(names_.size()));
+    const auto [at, isNew] = ids_.try_emplace(name, static_cast<u32>(names_.size()));
     if (isNew)
         names_.push_back(name);
     return at->second;

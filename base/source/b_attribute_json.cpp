@@ -12,20 +12,19 @@ constexpr string_view versionMember = "@version";
 constexpr string_view attributesMember = "@attributes";
 constexpr string_view objectsMember = "@objects";
 
-/// Names that a single one of the objects has.
-hash_map<string_view, u32> uniqueNames(const PluginFactory& factory,
-                                       const JSONWriteOptions& options) {
-    hash_map<string_view, u32> ids;
-    ids.reserve(factory.pluginCount());
+/// By the ids of the objects: the names that none of the others has.
+vector<const string*> uniqueNames(const PluginFactory& factory, const JSONWriteOptions& options) {
+    vector<const string*> names(factory.pluginCount());
+    hash_map<string_view, u32> firstIds;
+    firstIds.reserve(factory.pluginCount());
     for (const ref<IPlugin>& object : factory.plugins()) {
         const string* name = object && isWritten(*object, options) ? plainNameOf(*object) : nullptr;
         if (!name)
             continue;
-        const auto [at, isNew] = ids.emplace(*name, object->id());
-        if (!isNew)
-            at->second = IPlugin::noId;
+        const auto [first, isNew] = firstIds.try_emplace(*name, object->id());
+        names[first->second] = isNew ? name : nullptr;
     }
-    return ids;
+    return names;
 }
 
 bool isEmptyDocument(const AttribMap& attributes) {
@@ -68,7 +67,7 @@ public:
         JsonMembers members;
         collectMembers(in_, members);
         checkOwnMembers(members, known, in_, options_);
-        warnOfForeign(members);
+        warnOfForeign(members, in_, options_);
         attributes_ = placeOf(members, attributesMember);
         return checkVersion(placeOf(members, versionMember)) &&
                findObjects(placeOf(members, objectsMember));
@@ -127,23 +126,16 @@ private:
         log().log(logSystem, logError, "json parser {}({})| {}", in_.source(), in_.line(), text);
     }
 
-    void warnOfForeign(const JsonMembers& members) {
-        for (const DataMember& member : members) {
-            if (isOwnMember(member))
-                continue;
-            in_.setPlace(member.place);
-            logIgnored(in_, options_, member.name);
-        }
-    }
-
     bool checkVersion(u32 place) {
         i64 version = 0;
-        if (place != noPlace) {
-            in_.setPlace(place);
-            if (!in_.number(version))
-                version = 0;
-            in_.setPlace(place);
+        if (place == noPlace) {
+            logAtLine("Missing document version!");
+            return false;
         }
+        in_.setPlace(place);
+        if (!in_.number(version))
+            version = 0;
+        in_.setPlace(place);
         if (version == documentVersion)
             return true;
         log().log(logSystem, logError,
@@ -174,15 +166,30 @@ private:
         return true;
     }
 
+    /// The text that a member stands for, in either form; empty if it is none.
+    string_view textOf(const DataMember& member) {
+        if (member.kind != DataKind::object)
+            return member.text;
+        const u32 behind = in_.place();
+        in_.setPlace(member.place);
+        in_.enter();
+        string_view text;
+        for (DataMember inner; in_.nextMember(inner);)
+            if (inner.name == "@value")
+                text = inner.text;
+        in_.setPlace(behind);
+        return text;
+    }
+
     void createObject(u32 place) {
         string_view typeText, name;
         bool hasType = false;
         in_.enter();
         for (DataMember member; in_.nextMember(member);) {
             if (member.name == "@type")
-                hasType = readNameText(&member, typeText) && !typeText.empty();
+                hasType = readNameText(&member, typeText);
             else if (member.name == "name")
-                name = member.text;
+                name = textOf(member);
         }
         if (!hasType) {
             in_.setPlace(std::as_const(places_)[place]);
@@ -229,7 +236,7 @@ private:
 void PluginFactory::writeJson(Stream& stream) const {
     JSONWriteOptions options;
     options.factory = this;
-    options.idOfName = uniqueNames(*this, options);
+    options.uniqueNames = uniqueNames(*this, options);
     JSONAttrWriter out(stream);
     out.beginObject();
     out.name(versionMember);

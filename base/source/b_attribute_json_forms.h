@@ -87,7 +87,10 @@ private:
 void collectMembers(DataReader& in, JsonMembers& members);
 /// The last member of that name, null if there is none.
 const DataMember* findMember(const JsonMembers& members, string_view name);
-/// Warns of those among the form's own members that are not in `known`, and of repeated ones.
+/// Warns of all members that are not the form's own.
+void warnOfForeign(const JsonMembers& members, DataReader& in, const JSONReadOptions& options);
+/// Warns of those among the form's own members that are not in `known`, at most four, and of
+/// repeated ones.
 void checkOwnMembers(const JsonMembers& members, std::span<const string_view> known, DataReader& in,
                      const JSONReadOptions& options);
 /// Puts the other members into `map` as attributes.

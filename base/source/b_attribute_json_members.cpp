@@ -101,20 +101,32 @@ const DataMember* findMember(const JsonMembers& members, string_view name) {
     return nullptr;
 }
 
+void warnOfForeign(const JsonMembers& members, DataReader& in, const JSONReadOptions& options) {
+    const u32 start = in.place();
+    for (const DataMember& member : members) {
+        if (isOwnMember(member))
+            continue;
+        in.setPlace(member.place);
+        logIgnored(in, options, member.name);
+    }
+    in.setPlace(start);
+}
+
 void checkOwnMembers(const JsonMembers& members, std::span<const string_view> known, DataReader& in,
                      const JSONReadOptions& options) {
     const u32 start = in.place();
+    const DataMember* latest[4] = {}; // of each known name
     for (const DataMember& member : members) {
         if (!isOwnMember(member))
             continue;
-        const bool isKnown = std::find(known.begin(), known.end(), member.name) != known.end();
-        if (isKnown && findMember(members, member.name) == &member)
-            continue;
-        in.setPlace(member.place);
-        if (isKnown)
-            logRepeated(in, options, member.name);
-        else
+        const auto at = std::find(known.begin(), known.end(), member.name);
+        if (at == known.end()) {
+            in.setPlace(member.place);
             logIgnored(in, options, member.name);
+        } else if (const DataMember* former = std::exchange(latest[at - known.begin()], &member)) {
+            in.setPlace(former->place);
+            logRepeated(in, options, member.name);
+        }
         in.setPlace(start);
     }
 }

@@ -41,9 +41,7 @@ bool isWritten(const IPlugin& object, const JSONWriteOptions& options) {
 }
 
 const string* uniqueNameOf(const IPlugin& object, const JSONWriteOptions& options) {
-    const string* name = plainNameOf(object);
-    const auto found = name ? options.idOfName.find(*name) : options.idOfName.end();
-    return found != options.idOfName.end() && found->second == object.id() ? name : nullptr;
+    return object.id() < options.uniqueNames.size() ? options.uniqueNames[object.id()] : nullptr;
 }
 
 void writeReference(const IPlugin* object, string_view noneText, DataWriter& out,

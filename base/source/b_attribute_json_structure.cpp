@@ -1,6 +1,7 @@
 #include "b_attribute_json_forms.h"
 #include "b_exception.h"
 #include "b_log.h"
+#include "b_stored_document.h"
 #include "b_string_convert.h"
 
 namespace base {
@@ -76,7 +77,7 @@ struct StepText {
 };
 
 /// Reads a path entry, whose members have their order, and steps behind it.
-bool readStep(DataReader& in, StepText& step) {
+bool readStep(DataReader& in, bool isFirst, StepText& step) {
     if (in.kind() != DataKind::object)
         return logExpected(in, "name");
     in.enter();
@@ -92,6 +93,8 @@ bool readStep(DataReader& in, StepText& step) {
         kind > static_cast<u8>(PathStepKind::component))
         return logExpected(in, "type");
     step.kind = static_cast<PathStepKind>(kind);
+    if (step.kind == PathStepKind::plugin && !isFirst)
+        return logExpected(in, "type");
     if (in.kind() == DataKind::end) {
         in.leave();
         return true;
@@ -150,11 +153,17 @@ void logUnknownType(const DataReader& in, const JSONReadOptions& options, string
                   in.source(), options.owner, options.attribute, type, in.line());
 }
 
+/// An empty one is none.
+name_id ownType(string_view text) {
+    return text.empty() ? name_id() : validName(text);
+}
+
 /// Reads the form that tells its type, whose members are given. `in` stands at its beginning.
 Attribute* readLongForm(const JsonMembers& members, DataReader& in, JSONReadOptions& options,
                         bool isElement) {
     static constexpr string_view known[] = {"@type", "@flags", "@of", "@value"};
     checkOwnMembers(members, known, in, options);
+    warnOfForeign(members, in, options);
     string_view typeText, elementType;
     const DataMember* of = findMember(members, "@of");
     const DataMember* value = findMember(members, "@value");
@@ -176,7 +185,7 @@ Attribute* readLongForm(const JsonMembers& members, DataReader& in, JSONReadOpti
     in.setPlace(value->place);
     Attribute* read = readTyped(std::move(made), in, options);
     if (read && of && read->asArray())
-        read->asArray()->setTypeName(validName(elementType));
+        read->asArray()->setTypeName(ownType(elementType));
     return read;
 }
 
@@ -186,7 +195,7 @@ void readMap(AttribMap& map, const JsonMembers& members, DataReader& in, JSONRea
     const DataMember* type = findMember(members, "@map");
     string_view typeText;
     if (readNameText(type, typeText))
-        map.setTypeName(validName(typeText));
+        map.setTypeName(ownType(typeText));
     else if (type)
         logUnreadable(in, options, n_map.view());
     readMembers(map, members, in, options);
@@ -415,16 +424,14 @@ bool AttribLink::readJson(DataReader& in, JSONReadOptions& options) {
     IPlugin* root = nullptr;
     while (isRead && in.kind() != DataKind::end) {
         StepText step;
-        isRead = readStep(in, step);
-        const bool isPlugin = step.kind == PathStepKind::plugin;
-        const bool isRoot = isPlugin && path.empty();
+        isRead = readStep(in, path.empty(), step);
+        const bool isRoot = step.kind == PathStepKind::plugin;
         if (isRead && isRoot) {
             root = findRoot(in, step, options);
-            const bool isPlace = step.index < options.objects.size();
-            step.index = isPlace ? options.firstId + step.index : step.index;
+            step.index = shiftedId(step.index, options.firstId);
             step.name = {};
         }
-        name_id name = isPlugin ? nameServer().emptyName() : name_id();
+        name_id name = isRoot ? nameServer().emptyName() : name_id();
         if (!step.name.empty())
             name = validName(step.name);
         path.step(step.kind, name, step.index);

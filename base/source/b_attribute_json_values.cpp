@@ -1,5 +1,8 @@
 #include "b_attribute_json_forms.h"
 #include "b_attribute_values.h"
+#include "b_log.h"
+
+#include <cmath>
 
 namespace base {
 
@@ -45,9 +48,19 @@ bool forEachRun(std::span<T> values, Run run) {
     }
 }
 
+/// Readers refuse infinite floats, since they lie outside the range.
+void warnOfInfinite(std::span<const float> values, const JSONWriteOptions& options) {
+    if (std::any_of(values.begin(), values.end(), [](float value) { return std::isinf(value); }))
+        log().log(logSystem, logWarning,
+                  "json writer| Attribute '{}::{}' has infinite floats and can't be read again!",
+                  options.owner, options.attribute);
+}
+
 template <class T>
-void writeNumbers(std::span<const T> values, DataWriter& out) {
+void writeNumbers(std::span<const T> values, DataWriter& out, const JSONWriteOptions& options) {
     forEachRun(values, [&](auto run) {
+        if constexpr (std::is_same_v<decltype(run), std::span<const float>>)
+            warnOfInfinite(run, options);
         out.numbers(run);
         return true;
     });
@@ -110,7 +123,7 @@ void writeValue(const T& value, DataWriter& out, const JSONWriteOptions& options
     } else {
         if (numberCount < T >> 1)
             out.beginArray(DataLayout::flow);
-        writeNumbers(std::span(&value, 1), out);
+        writeNumbers(std::span(&value, 1), out, options);
         if (numberCount < T >> 1)
             out.endArray();
     }
@@ -152,7 +165,7 @@ void writeElements(const vector<T>& values, DataWriter& out, const JSONWriteOpti
         for (const ref<IPlugin>& value : values)
             writeReference(value.get(), noElementReference, out, options);
     } else {
-        writeNumbers(std::span(values.data(), values.size()), out);
+        writeNumbers(std::span(values.data(), values.size()), out, options);
     }
     out.endArray();
 }
@@ -190,6 +203,7 @@ void TypedAttribute<T>::writeJson(DataWriter& out, JSONWriteOptions& options) co
         isPlain = isPlain && isValidUtf8(value_);
     if constexpr (std::is_same_v<T, float>) {
         if (isPlain) {
+            warnOfInfinite({&value_, 1}, options);
             out.real(value_);
             return;
         }

@@ -1,5 +1,7 @@
 #include "b_attribute_json.h"
 
+#include "b_exception.h"
+#include "b_json_pull.h"
 #include "b_number_type.h"
 #include "stream/b_stream.h"
 
@@ -12,8 +14,8 @@ namespace base {
 namespace {
 
 constexpr std::size_t blockSize = 256 * 1024;
-constexpr i64 lineLength = 100;         ///< a line that flows ends with the first value beyond it
-constexpr std::size_t numberRoom = 32;  ///< for the text of any number
+constexpr i64 lineLength = 100;        ///< a line that flows ends with the first value beyond it
+constexpr std::size_t numberRoom = 32; ///< for the text of any number
 constexpr std::size_t indentation = 2;
 
 constexpr string_view hexDigits = "0123456789abcdef";
@@ -81,6 +83,11 @@ void JSONAttrWriter::finish() {
 
 void JSONAttrWriter::flush() {
     const std::size_t count = static_cast<std::size_t>(at_ - block_.get());
+    written_ += count;
+    if (written_ > GenericPullReader::maxTextLength)
+        throw exception("The JSON form takes more than 1 GiB, which nothing reads. Use the binary "
+                        "form.",
+                        "b_attribute_json", "base::JSONAttrWriter", __LINE__);
     lineStart_ -= static_cast<i64>(count);
     at_ = block_.get();
     stream_.write(at_, count);
@@ -185,19 +192,30 @@ void JSONAttrWriter::real(float value) {
 }
 
 void JSONAttrWriter::putQuoted(string_view text) {
+    constexpr std::size_t longestEscape = 6;
+    constexpr std::size_t pieceLength = blockSize / longestEscape;
     put("\"");
     while (!text.empty()) {
-        std::size_t plain = 0;
-        while (plain < text.size() && plain < blockSize && !escapeOf(text[plain]))
-            ++plain;
-        put(text.substr(0, plain));
-        text.remove_prefix(plain);
-        if (text.empty() || plain == blockSize)
-            continue;
-        const u8 c = static_cast<u8>(text.front());
-        const char code[] = {'\\', escapes[c], '0', '0', hexDigits[c >> 4], hexDigits[c & 15]};
-        put({code, code[1] == 'u' ? sizeof code : 2});
-        text.remove_prefix(1);
+        const string_view piece = text.substr(0, pieceLength);
+        text.remove_prefix(piece.size());
+        require(piece.size() * longestEscape);
+        char* at = at_;
+        for (const char c : piece) {
+            const char escape = escapeOf(c);
+            if (!escape) {
+                *at++ = c;
+                continue;
+            }
+            *at++ = '\\';
+            *at++ = escape;
+            if (escape == 'u') {
+                const auto code = static_cast<u8>(c);
+                at = copy("00", at);
+                *at++ = hexDigits[code >> 4];
+                *at++ = hexDigits[code & 15];
+            }
+        }
+        at_ = at;
     }
     put("\"");
 }

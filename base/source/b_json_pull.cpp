@@ -72,6 +72,7 @@ struct StackAllocator {
 };
 
 constexpr const char* tooBigText = "Number too big to be stored in double.";
+constexpr const char* wordWithDigitsText = "Invalid value.";
 constexpr const char* zeroByteText = "Zero byte in the text.";
 
 } // namespace
@@ -85,7 +86,7 @@ struct EventRecorder {
     const TextSource& source;
     GrowingBlock<u32> open{}; ///< indices of the begin events without an end
     std::size_t openCount = 0;
-    bool isTooBig = false;
+    const char* fault = nullptr; ///< found in a number
 
     Event& add(Kind kind) {
         Event event{};
@@ -115,14 +116,22 @@ struct EventRecorder {
         return true;
     }
     bool Double(double value) {
-        const std::size_t end = source.Tell();
-        const bool hasExponent = exponentStart(end) != 0;
-        if (hasExponent && !convert(end, value)) {
-            isTooBig = true;
+        const string_view text = numberText();
+        if (text.empty()) { // a word
+            add(Kind::real).real = value;
+            return true;
+        }
+        const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), value);
+        if (end != text.data() + text.size() || isWordBefore(text)) {
+            fault = wordWithDigitsText;
             return false;
         }
-        const bool isHuge = !hasExponent && isIntegerBefore(end, value);
-        add(isHuge ? Kind::hugeReal : Kind::real).real = value;
+        if (error != std::errc() && !isTiny(text, value)) {
+            fault = tooBigText;
+            return false;
+        }
+        const bool isInteger = text.find_first_of(".eE") == string_view::npos;
+        add(isInteger ? Kind::hugeReal : Kind::real).real = value;
         return true;
     }
     bool String(const char* text, rapidjson::SizeType length, bool) {
@@ -138,48 +147,32 @@ struct EventRecorder {
     bool EndArray(rapidjson::SizeType count) { return end(count); }
 
 private:
-    char textAt(std::size_t offset) const { return reader.text_[offset]; }
-
-    std::size_t digitsStart(std::size_t end) const {
-        while (end > 0 && textAt(end - 1) >= '0' && textAt(end - 1) <= '9')
-            --end;
-        return end;
-    }
-
-    /// Offset of the letter of the number that ends at `end`, 0 if it has no exponent.
-    std::size_t exponentStart(std::size_t end) const {
-        std::size_t at = digitsStart(end);
-        if (at > 0 && (textAt(at - 1) == '+' || textAt(at - 1) == '-'))
-            --at;
-        return at > 0 && (textAt(at - 1) | 0x20) == 'e' && at < end ? at - 1 : 0;
-    }
-
-    /// The value of a number with exponent; the parser's is wrong where it leaves the range of
-    /// double. False if it is too large.
-    bool convert(std::size_t end, double& value) const {
-        std::size_t start = digitsStart(exponentStart(end));
-        if (start > 0 && textAt(start - 1) == '.')
-            start = digitsStart(start - 1);
-        if (start > 0 && textAt(start - 1) == '-')
+    /// The number that ends here, as it stands; empty for NaN and Infinity. The parser's own values
+    /// are not exact, and wrong where they leave the range of double.
+    string_view numberText() const {
+        const std::size_t end = source.Tell();
+        std::size_t start = end;
+        while (start > 0 &&
+               string_view("0123456789+-.eE").find(reader.text_[start - 1]) != string_view::npos)
             --start;
-        const char* const first = reader.text_.data() + start;
-        const char* const last = reader.text_.data() + end;
-        if (std::from_chars(first, last, value).ec == std::errc())
-            return true;
-        long double wide = 0;
-        const bool isFar = std::from_chars(first, last, wide).ec != std::errc();
-        // The parser has refused exponents that leave even this range upwards.
-        value = textAt(start) == '-' ? -0.0 : 0.0;
-        return isFar || std::fabs(wide) < 1;
+        return reader.text_.substr(start, end - start);
     }
 
-    /// True if the number that ends at `end` has no fraction and is beyond all integer types.
-    bool isIntegerBefore(std::size_t end, double value) const {
-        constexpr double beyondNatural = 18446744073709551615.0, beyondNegative = -9.2e18;
-        if (!(value >= beyondNatural || value <= beyondNegative))
-            return false;
-        const std::size_t start = digitsStart(end);
-        return start < end && (start == 0 || textAt(start - 1) != '.');
+    /// True for digits that go on behind NaN or Infinity, which the parser takes for one number.
+    bool isWordBefore(string_view number) const {
+        const char* const start = number.data();
+        return start != reader.text_.data() &&
+               ((start[-1] | 0x20) >= 'a' && (start[-1] | 0x20) <= 'z');
+    }
+
+    /// For a number that is no double: true, and a zero as `value`, if it is too small for one.
+    static bool isTiny(string_view number, double& value) {
+        long double wide = 0;
+        const bool isFar =
+            std::from_chars(number.data(), number.data() + number.size(), wide).ec != std::errc();
+        // The parser has refused exponents that leave even this range upwards.
+        value = number.front() == '-' ? -0.0 : 0.0;
+        return isFar || std::fabs(wide) < 1;
     }
 
     bool addText(Kind kind, const char* text, std::size_t length) {
@@ -217,15 +210,14 @@ private:
 };
 
 GenericPullReader::Fault GenericPullReader::parse(string_view text) {
-    constexpr unsigned flags = rapidjson::kParseIterativeFlag | rapidjson::kParseFullPrecisionFlag |
-                               rapidjson::kParseNanAndInfFlag;
+    constexpr unsigned flags = rapidjson::kParseIterativeFlag | rapidjson::kParseNanAndInfFlag;
     text_ = text;
     TextSource source(text);
     EventRecorder recorder{*this, source};
     rapidjson::GenericReader<rapidjson::UTF8<>, rapidjson::UTF8<>, StackAllocator> parser;
     const rapidjson::ParseResult result = parser.Parse<flags>(source, recorder);
-    if (recorder.isTooBig)
-        return {result.Offset(), tooBigText};
+    if (recorder.fault)
+        return {result.Offset(), recorder.fault};
     if (result.IsError())
         return {result.Offset(), rapidjson::GetParseError_En(result.Code())};
     if (source.Tell() != text.size())
@@ -236,12 +228,13 @@ GenericPullReader::Fault GenericPullReader::parse(string_view text) {
 
 u32 GenericPullReader::lineOf(std::size_t offset) const {
     offset = std::min(offset, text_.size());
-    if (offset < countedOffset_) {
-        countedOffset_ = 0;
-        countedLine_ = 1;
-    }
-    const char* from = text_.data();
-    countedLine_ += static_cast<u32>(std::count(from + countedOffset_, from + offset, '\n'));
+    const auto linesBetween = [this](std::size_t from, std::size_t to) {
+        return static_cast<u32>(std::count(text_.data() + from, text_.data() + to, '\n'));
+    };
+    if (offset < countedOffset_)
+        countedLine_ -= linesBetween(offset, countedOffset_);
+    else
+        countedLine_ += linesBetween(countedOffset_, offset);
     countedOffset_ = offset;
     return countedLine_;
 }

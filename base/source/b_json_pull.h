@@ -127,7 +127,7 @@ private:
     GrowingBlock<Event> events_;
     GrowingBlock<char> decoded_; ///< texts that had escapes
     u32 at_ = 0;
-    // Messages go forward through the text: the last answer shortens the next count.
+    // Messages stand close to each other in the text: the last answer shortens the next count.
     mutable std::size_t countedOffset_ = 0;
     mutable u32 countedLine_ = 1;
 };

@@ -28,6 +28,7 @@ ref<IPlugin> createStored(PluginFactory& factory, name_id type, u32 id) {
 
 void PluginFactory::readDocument(StoredDocument& document, i32 version) {
     const u32 firstId = pluginCount();
+    const std::size_t dummiesBefore = dummyDescs_.size();
     std::unique_ptr<Attribute> attributesBefore;
     try {
         plugins_.resize(firstId + document.objectCount());
@@ -51,6 +52,9 @@ void PluginFactory::readDocument(StoredDocument& document, i32 version) {
             }
         }
         plugins_.resize(firstId);
+        for (std::size_t i = dummiesBefore; i < dummyDescs_.size(); ++i)
+            unregisterDesc(std::as_const(dummyDescs_)[i]);
+        dummyDescs_.resize(dummiesBefore);
         throw;
     }
 }

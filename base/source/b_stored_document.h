@@ -40,6 +40,12 @@ public:
     virtual std::unique_ptr<AttribMap> readAttributes() = 0;
 };
 
+/// The id of an object in the list that it is read into. None stays none.
+constexpr u32 shiftedId(u32 storedId, u32 firstId) {
+    const u64 id = u64{storedId} + firstId;
+    return id >= IPlugin::noId ? IPlugin::noId : static_cast<u32>(id);
+}
+
 /// Makes an object at a place of the list; of an unknown type a dummy, which is reported.
 ref<IPlugin> createStored(PluginFactory& factory, name_id type, u32 id);
 

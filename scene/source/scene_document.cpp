@@ -5,6 +5,7 @@
 
 #include "b_exception.h"
 #include "b_format.h"
+#include "b_log.h"
 #include "b_string_convert.h"
 #include "stream/b_fs.h"
 
@@ -28,12 +29,6 @@ bool isBinary(string_view path) {
     return endsWithExtension(path, sceneDocumentExtensions[0]);
 }
 
-/// The file name without the extension.
-string documentName(const string& path) {
-    const string name = fs::fileName(path);
-    return name.substr(0, name.size() - (isBinary(path) ? 6 : 11));
-}
-
 /// Calls `use` with each texture that shows a file and with the path of that.
 template <class Use>
 void forEachPicture(base::PluginFactory& document, const Use& use) {
@@ -46,12 +41,21 @@ void forEachPicture(base::PluginFactory& document, const Use& use) {
     }
 }
 
-/// The path of a file as seen from `folder`, which it need not lie in.
+/// The path of a file that exists as seen from `folder`, which it need not lie in; a full path if
+/// the way leads by the root or through links that turn it aside.
 string pathFrom(const string& folder, const string& file) {
+    namespace stdfs = std::filesystem;
     std::error_code error;
-    const std::filesystem::path base = folder.empty() ? "." : folder;
-    const std::filesystem::path relative = std::filesystem::proximate(file, base, error);
-    return error ? file : relative.generic_string();
+    const stdfs::path full = stdfs::absolute(fs::master().resolve(file), error).lexically_normal();
+    const stdfs::path start =
+        stdfs::absolute(folder.empty() ? "." : folder, error).lexically_normal();
+    const stdfs::path relative = full.lexically_proximate(start);
+    const auto isName = [](const stdfs::path& part) { return !part.empty(); };
+    const bool isByRoot = std::ranges::count(relative, stdfs::path("..")) >=
+                          std::ranges::count_if(start.relative_path(), isName);
+    if (isByRoot || !stdfs::equivalent(start / relative, full, error))
+        return full.generic_string();
+    return relative.generic_string();
 }
 
 /// Names the pictures of a document as they are stored while this lives; makes files of those that
@@ -59,15 +63,19 @@ string pathFrom(const string& folder, const string& file) {
 class StoredPictures : base::NonCopyable {
 public:
     StoredPictures(base::PluginFactory& document, const string& path)
-        : folder_(fs::folder(path)), pictures_(documentName(path) + ".pictures/") {
+        : folder_(fs::folder(path)), pictures_(fs::fileName(path) + ".pictures/") {
         forEachPicture(document, [&](base::IPlugin& texture, const string& file) {
             const string stored = findPictureSource(texture) ? copied(file) : named(file);
             if (stored != file)
                 stored_.push_back({base::ref<base::IPlugin>(&texture), stored});
         });
-        swapNames();
+        std::ranges::for_each(stored_, swapName);
     }
-    ~StoredPictures() { swapNames(); }
+    /// In reverse, since the name of one texture may be a link to that of another.
+    ~StoredPictures() {
+        for (std::size_t i = stored_.size(); i-- > 0;)
+            swapName(stored_[i]);
+    }
 
     /// The files that were made.
     const base::vector<string>& written() const { return written_; }
@@ -78,14 +86,17 @@ private:
         string file; ///< for the document or, while that is written, for the scene
     };
 
-    void swapNames() {
-        for (StoredName& stored : stored_)
-            std::swap(write(*stored.texture, fileTexture_schema::n_file), stored.file);
+    static void swapName(StoredName& stored) {
+        std::swap(write(*stored.texture, fileTexture_schema::n_file), stored.file);
     }
 
-    /// A file that is found from the current folder is named from the document's.
+    /// A file that is there is named from the document's folder.
     string named(const string& file) const {
-        return fs::isAbsolute(file) || !fs::master().exists(file) ? file : pathFrom(folder_, file);
+        if (fs::master().exists(file))
+            return pathFrom(folder_, file);
+        base::log().log(base::logScene, base::logWarning,
+                        "document |{}| The picture is not there and keeps its name!", file);
+        return file;
     }
 
     /// The name of a copy in the folder of pictures, unlike those of other pictures.

@@ -24,7 +24,7 @@ ByteList smallDocument() {
     file.u32(2).text("count").text("i32");
     file.u32(1).u32(1).text("i32");
     file.u32(1).text("thing");
-    file.u32(5).u8(0).u32(0);
+    file.text("kind").u32(5).u8(0).u32(0);
     file.u32(2).u32(0).u32(0).u32(0xffffffff).u32(1);
     file.u32(18).u8(0).u32(1);
     file.u16(0).u16(1).u32(5).u8(0x80).u32(258);
@@ -33,6 +33,7 @@ ByteList smallDocument() {
 
 TEST(BinaryDocument, HasTheseBytes) {
     PluginFactory factory;
+    factory.attributes().setTypeName(named("kind"));
     IPlugin& thing = *factory.create(named("thing"));
     thing.attribute<i32>(named("count")) = 258;
     thing.findAttribute(named("count"))->setFlags(attribSilentLink | attribAnimated);
@@ -40,10 +41,13 @@ TEST(BinaryDocument, HasTheseBytes) {
     EXPECT_EQ(written(factory), smallDocument().bytes());
 
     const ByteList file = smallDocument();
+    ByteList more = file;
+    more.raw("more");
     PluginFactory read;
-    Stream stream = viewOf(file.bytes(), true);
+    Stream stream = viewOf(more.bytes(), true);
     ASSERT_TRUE(read.read(stream));
     EXPECT_EQ(stream.position(), file.size());
+    EXPECT_EQ(read.attributes().typeName(), named("kind"));
     ASSERT_EQ(read.pluginCount(), 2u);
     EXPECT_FALSE(read.plugin(1));
     ASSERT_TRUE(read.plugin(0));

@@ -41,7 +41,7 @@ ByteList head(std::initializer_list<const char*> types = {}) {
     file.raw("BPF1").u32(1).u32(0).u32(1).u32(0).u32(types.size());
     for (const char* type : types)
         file.text(type);
-    return file;
+    return file.text(""); // no own type of the document's attributes
 }
 
 /// The same with one object that holds `map`.
@@ -136,6 +136,7 @@ TEST(BinaryMessages, TellWhatIsWrong) {
              .text("u8")
              .text("x")
              .u32(0)
+             .text("")
              .u32(5)
              .u8(0)
              .u32(0)

@@ -167,6 +167,24 @@ TEST(JsonDocument, FloatsComeBackToTheBit) {
     EXPECT_EQ(firstDifference(written, read), "");
 }
 
+TEST(JsonDocument, LongTextsComeBack) {
+    PluginFactory written, read;
+    string text;
+    for (int i = 0; i < 200000; ++i)
+        text += "a\x01\"";
+    written.create(nameOf("kind"))->attribute<string>(nameOf("text")) = text;
+    ASSERT_TRUE(readJsonText(read, writtenJson(written)));
+    EXPECT_EQ(firstDifference(written, read), "");
+}
+
+TEST(JsonDocument, NamesCountInBothForms) {
+    PluginFactory read;
+    ASSERT_TRUE(readJsonText(read, R"({"@version": 1, "@objects": [
+        {"@type": "kind", "name": {"@type": "string", "@flags": 1, "@value": "gate"}},
+        {"@type": "", "of": {"@type": "plugin", "@value": "gate"}}]})"));
+    EXPECT_EQ(*read.plugin(1)->findAttribute<ref<IPlugin>>(nameOf("of")), read.plugin(0));
+}
+
 TEST(JsonDocument, MembersComeInAnyOrder) {
     PluginFactory inOrder, shuffled;
     const std::string value = R"("a": {"@type": "array", "@flags": 4, "@of": "k", "@value": [1]})";

@@ -116,26 +116,32 @@ TEST(SceneDocument, NamesPicturesFromItsFolder) {
     const base::u32 beside = addTexture(builder, "wood.png"), gone = addTexture(builder, "no.png"),
                     full = addTexture(builder, folder / "work/wood.png"),
                     held = addTexture(builder, folder / "held/a/Skin.png"),
-                    other = addTexture(builder, folder / "held/b/skin.png");
-    for (const base::u32 id : {held, other})
+                    other = addTexture(builder, folder / "held/b/skin.png"),
+                    shared = addTexture(builder, folder / "held/a/Skin.png");
+    for (const base::u32 id : {held, other, shared})
         scene::setPictureSource(*builder.factory->plugin(id), "model.fbx");
     stdfs::create_directory(folder / "out");
-    scene::writeSceneDocument(*builder.factory, "../out/box.scene.json");
+    const LogCapture log;
+    EXPECT_EQ(scene::writeSceneDocument(*builder.factory, "../out/box.scene.json").size(), 3u);
     stdfs::current_path(before);
+    EXPECT_EQ(problems(log), "3 document |no.png| The picture is not there and keeps its name!\n");
 
     const auto fileOf = [](base::PluginFactory& document, base::u32 id) {
         return *find(*document.plugin(id), fileTexture_schema::n_file);
     };
     EXPECT_EQ(fileOf(*builder.factory, held), std::string(folder / "held/a/Skin.png"));
-    stdfs::rename(folder / "out", folder / "moved");
+    stdfs::create_directory(folder / "moved");
+    for (const char* name : {"out", "work"})
+        stdfs::rename(folder / name, folder / (std::string("moved/") + name));
     stdfs::remove_all(folder / "held");
-    const auto document = readBack(folder / "moved/box.scene.json");
+    const auto document = readBack(folder / "moved/out/box.scene.json");
     EXPECT_EQ(readText(fileOf(*document, beside)), "wood");
     EXPECT_EQ(fileOf(*document, gone), "no.png");
-    EXPECT_EQ(fileOf(*document, full), std::string(folder / "work/wood.png"));
-    EXPECT_EQ(readText(folder / "moved/box.pictures/Skin.png"), "first");
+    EXPECT_EQ(readText(fileOf(*document, full)), "wood");
+    EXPECT_EQ(readText(folder / "moved/out/box.scene.json.pictures/Skin.png"), "first");
     EXPECT_EQ(readText(fileOf(*document, held)), "first");
     EXPECT_EQ(readText(fileOf(*document, other)), "second");
+    EXPECT_EQ(fileOf(*document, shared), fileOf(*document, held));
 }
 
 TEST(SceneDocument, RefusesWhatIsNone) {
@@ -145,13 +151,16 @@ TEST(SceneDocument, RefusesWhatIsNone) {
     writeText(folder / "empty.scene.json", "");
     writeText(folder / "cut.scene.json", "{\"@version\": 1, \"@objects\": [{\"@type\": \"node\"}");
     writeText(folder / "later.scene.json", "{\"@version\": 2, \"@objects\": []}");
-    for (const char* name : {"empty.scene", "text.scene", "empty.scene.json", "cut.scene.json",
-                             "later.scene.json", "missing.scene"}) {
+    SceneBuilder builder;
+    scene::writeSceneDocument(*builder.factory, folder / "whole.scene");
+    const std::string whole = readText(folder / "whole.scene");
+    writeText(folder / "cut.scene", whole.substr(0, whole.size() - 3));
+    for (const char* name : {"empty.scene", "text.scene", "cut.scene", "empty.scene.json",
+                             "cut.scene.json", "later.scene.json", "missing.scene"}) {
         auto document = base::makeRef<scene::SceneFactory>();
         EXPECT_THROW(scene::readSceneDocument(*document, folder / name), base::exception) << name;
         EXPECT_EQ(document->pluginCount(), 0u) << name;
     }
-    SceneBuilder builder;
     EXPECT_THROW(scene::writeSceneDocument(*builder.factory, folder / "none/a.scene"),
                  base::exception);
     if (std::filesystem::exists("/dev/full")) {
