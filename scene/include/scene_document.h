@@ -23,8 +23,9 @@ SCENE_API bool isSceneDocument(base::string_view path);
 SCENE_API void readSceneDocument(base::PluginFactory& document, const base::string& path);
 
 /// Writes all of `document` to `path`, in the form that the extension tells, and pictures beside it
-/// where they have no file. While it writes, the textures have the names that it stores. Returns the files, the document first. Throws `base::exception` if one
-/// can't be written; others may be there then. What closing a file brings to light is logged.
+/// where they have no file. While it writes, the textures have the names that it stores. Returns
+/// the files, the document first. Throws `base::exception` if one can't be written; others may be
+/// there then. What closing a file brings to light is logged.
 SCENE_API base::vector<base::string> writeSceneDocument(base::PluginFactory& document,
                                                         const base::string& path);
 
