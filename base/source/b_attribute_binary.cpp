@@ -2,6 +2,7 @@
 
 #include "b_attribute_binary_reader.h"
 #include "b_attribute_binary_writer.h"
+#include "b_stored_document.h"
 
 #include <array>
 
@@ -121,7 +122,7 @@ bool Attribute::read(Stream& stream, BinaryReadOptions& options) {
     u8 low = 0;
     if (!in.number(low))
         return false;
-    setFlags((flags() & ~u32{0xff}) | low);
+    setFlags((flags() & ~storedFlags) | low);
     return true;
 }
 

@@ -5,6 +5,7 @@
 #include "b_factory.h"
 #include "b_format.h"
 #include "b_log.h"
+#include "b_nested_level.h"
 
 namespace base {
 
@@ -155,10 +156,7 @@ IPlugin* BinaryReader::object(u32 storedId) const {
 }
 
 BinaryReader::Level::Level(BinaryReader& reader) : state_(reader.state()) {
-    if (state_.depth == maxBinaryDepth)
-        throw exception("Attributes are nested deeper than 256 levels.", "b_attribute",
-                        "base::Attribute::read", __LINE__);
-    ++state_.depth;
+    enterLevel(state_.depth, "base::Attribute::read");
 }
 
 } // namespace base

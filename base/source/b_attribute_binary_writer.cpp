@@ -4,6 +4,8 @@
 #include "b_factory.h"
 #include "b_format.h"
 #include "b_log.h"
+#include "b_nested_level.h"
+#include "b_stored_document.h"
 
 #include <bit>
 
@@ -29,12 +31,6 @@ const NameRecord& recordOf(name_id name) {
 
 [[noreturn]] void throwWriting(string text) {
     throw exception(std::move(text), "b_attribute", "base::Attribute::write", __LINE__);
-}
-
-void enterLevel(u32& depth) {
-    if (depth == maxBinaryDepth)
-        throwWriting("Attributes are nested deeper than 256 levels.");
-    ++depth;
 }
 
 name_id storedType(const Attribute& attribute, hash_map<name_id, name_id>& mapTypes) {
@@ -69,7 +65,7 @@ public:
 
 private:
     u64 map(const AttribMap& map) {
-        enterLevel(state_.depth);
+        enterLevel(state_.depth, "base::Attribute::write");
         u64 total = sizeof(u32);
         for (const AttribMap::Entry& entry : map.entries())
             if (isStored(*entry.second))
@@ -79,7 +75,7 @@ private:
     }
 
     u64 array(const AttribArray& array) {
-        enterLevel(state_.depth);
+        enterLevel(state_.depth, "base::Attribute::write");
         u64 total = sizeof(u32) + name(array.typeName());
         for (const Attribute* item : array.items())
             total += item && isStored(*item) ? sized(*item) : name({});
@@ -146,14 +142,6 @@ u32 BinaryTypeTable::add(name_id name) {
     if (isNew)
         names_.push_back(name);
     return at->second;
-}
-
-bool isStored(const Attribute& attribute) {
-    if (attribute.hasFlag(attribTransient))
-        return false;
-    const AttribLink* link = attribute.asLink();
-    const IPlugin* root = link ? link->path().root() : nullptr;
-    return !root || !root->hasFlag(attribTransient);
 }
 
 u64 measureBinary(const Attribute& attribute, BinaryWriteState& state) {

@@ -11,7 +11,6 @@
 /// is measured first, in the order in which it will be written.
 namespace base {
 
-constexpr u32 maxBinaryDepth = 256;
 constexpr u32 maxBinaryString = 0x10000000;
 constexpr u32 maxBinaryTableString = 2048;
 
@@ -57,9 +56,6 @@ struct BinaryWriteState {
     const IPlugin* object = nullptr; ///< that is being written, null if none
     name_id attributeName;           ///< the innermost that is being written
 };
-
-/// False for what maps leave out and arrays write as null.
-bool isStored(const Attribute& attribute);
 
 /// Bytes of a whole attribute with its flags; adds what it needs to the lists of the state.
 u64 measureBinary(const Attribute& attribute, BinaryWriteState& state);

@@ -1,6 +1,5 @@
 #include "b_attribute_json_forms.h"
 #include "b_log.h"
-#include "b_stored_document.h"
 
 namespace base {
 
@@ -30,7 +29,7 @@ vector<const string*> uniqueNames(const PluginFactory& factory, const JSONWriteO
 bool isEmptyDocument(const AttribMap& attributes) {
     return (attributes.flags() & storedFlags) == 0 && attributes.typeName().isEmpty() &&
            std::all_of(attributes.entries().begin(), attributes.entries().end(),
-                       [](const AttribMap::Entry& entry) { return isLeftOut(*entry.second); });
+                       [](const AttribMap::Entry& entry) { return !isStored(*entry.second); });
 }
 
 void writeObject(const IPlugin& object, DataWriter& out, JSONWriteOptions& options) {

@@ -2,15 +2,11 @@
 
 #include "b_attribute_json.h"
 #include "b_factory.h"
+#include "b_nested_level.h"
+#include "b_stored_document.h"
 
 /// What the parts of the JSON form share.
 namespace base {
-
-constexpr u32 storedFlags = 0xff; ///< the bits of the flags word that are written
-
-/// True for what is never written: transient attributes, and links that start at a transient
-/// object.
-bool isLeftOut(const Attribute& attribute);
 
 bool isValidUtf8(string_view text);
 /// Text of a name; what is no UTF-8 is replaced, in `repaired` and with a warning.
@@ -20,7 +16,7 @@ string_view validText(name_id name, const JSONWriteOptions& options, string& rep
 class NestedValue : public NonCopyable {
 public:
     /// Throws `exception` beyond 256 levels.
-    explicit NestedValue(u32& depth);
+    explicit NestedValue(u32& depth) : depth_(depth) { enterLevel(depth, "base::NestedValue"); }
     ~NestedValue() { --depth_; }
 
 private:

@@ -1,19 +1,15 @@
 #include "b_attribute_json_forms.h"
-#include "b_exception.h"
 #include "b_log.h"
-#include "b_stored_document.h"
 #include "b_string_convert.h"
 
 namespace base {
 
 namespace {
 
-constexpr u32 maxDepth = 256;
-
 /// The type name that a reader takes from the elements of an array.
 name_id impliedTypeName(const AttribArray& array) {
     for (const Attribute* item : array.items())
-        if (item && item->asMap() && !isLeftOut(*item))
+        if (item && item->asMap() && isStored(*item))
             return item->asMap()->typeName();
     return {};
 }
@@ -25,7 +21,7 @@ bool isSameType(name_id a, name_id b) {
 void writeElements(const AttribArray& array, DataWriter& out, JSONWriteOptions& options) {
     out.beginArray();
     for (const Attribute* item : array.items()) {
-        if (item && !isLeftOut(*item))
+        if (item && isStored(*item))
             item->writeJson(out, options);
         else
             out.null();
@@ -255,21 +251,6 @@ Attribute* readAttribute(DataReader& in, JSONReadOptions& options, bool isElemen
 
 } // namespace
 
-NestedValue::NestedValue(u32& depth) : depth_(depth) {
-    if (depth == maxDepth)
-        throw exception("Attributes are nested deeper than 256 levels.", "b_attribute_json",
-                        "base::NestedValue", __LINE__);
-    ++depth;
-}
-
-bool isLeftOut(const Attribute& attribute) {
-    if (attribute.hasFlag(attribTransient))
-        return true;
-    const AttribLink* link = attribute.asLink();
-    const IPlugin* root = link ? link->path().root() : nullptr;
-    return root && root->hasFlag(attribTransient);
-}
-
 bool isValidUtf8(string_view text) {
     char seen = 0;
     for (const char c : text)
@@ -322,7 +303,7 @@ void writeMembers(const AttribMap& map, DataWriter& out, JSONWriteOptions& optio
     vector<const AttribMap::Entry*> written;
     written.reserve(map.size());
     for (const AttribMap::Entry& entry : map.entries())
-        if (!isLeftOut(*entry.second))
+        if (isStored(*entry.second))
             written.push_back(&entry);
     const auto byText = [](const AttribMap::Entry* a, const AttribMap::Entry* b) {
         return a->first.view() < b->first.view();

@@ -1,12 +1,13 @@
 #include "b_attribute_links.h"
 #include "b_attribute_values.h"
 #include "b_exception.h"
+#include "b_nested_level.h"
 
 namespace base {
 
 namespace {
 
-constexpr u32 maxCloneDepth = 256;
+constexpr u32 mostLevels = 256;
 thread_local u32 cloneDepth = 0;
 
 /// The links that one question "is it animated?" on this thread has asked already. Each is asked
@@ -71,11 +72,15 @@ struct Copies : NonCopyable {
 
 } // namespace
 
+void enterLevel(u32& depth, const char* function) {
+    if (depth == mostLevels)
+        throw exception("Attributes are nested deeper than 256 levels.", "b_attribute", function,
+                        __LINE__);
+    ++depth;
+}
+
 CloneDepth::CloneDepth() {
-    if (cloneDepth == maxCloneDepth)
-        throw exception("Attributes are nested deeper than 256 levels.", "b_attribute",
-                        "base::Attribute::clone", __LINE__);
-    ++cloneDepth;
+    enterLevel(cloneDepth, "base::Attribute::clone");
 }
 
 CloneDepth::~CloneDepth() {

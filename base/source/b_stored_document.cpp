@@ -6,7 +6,6 @@ namespace {
 
 /// Takes over attributes, the stored flags and the type, if there is one.
 void addAttributes(AttribMap& target, const AttribMap& read) {
-    constexpr u32 storedFlags = 0xff;
     target.assign(read, assignAdopt);
     target.setFlags((target.flags() & ~storedFlags) | (read.flags() & storedFlags));
     if (!read.typeName().isEmpty())
@@ -14,6 +13,14 @@ void addAttributes(AttribMap& target, const AttribMap& read) {
 }
 
 } // namespace
+
+bool isStored(const Attribute& attribute) {
+    if (attribute.hasFlag(attribTransient))
+        return false;
+    const AttribLink* link = attribute.asLink();
+    const IPlugin* root = link ? link->path().root() : nullptr;
+    return !root || !root->hasFlag(attribTransient);
+}
 
 ref<IPlugin> createStored(PluginFactory& factory, name_id type, u32 id) {
     if (!factory.hasDesc(type)) {

@@ -3,8 +3,14 @@
 #include "b_factory.h"
 #include "b_log.h"
 
-/// What reading and writing a whole document has in common, whatever its form.
+/// What the forms that documents are stored in have in common.
 namespace base {
+
+constexpr u32 storedFlags = 0xff; ///< the bits of the flags word that are stored
+
+/// False for what maps leave out and arrays write as null: transient attributes, and links that
+/// start at a transient object.
+bool isStored(const Attribute& attribute);
 
 /// Reports how far a list is, as often as the percentage changes, and the end when it dies.
 class ListProgress : public NonCopyable {
