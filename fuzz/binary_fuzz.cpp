@@ -1,23 +1,15 @@
+#include "require.h"
+
 #include "b_exception.h"
 #include "b_factory.h"
 #include "b_log.h"
 #include "stream/b_stream_workers.h"
-
-#include <cstdio>
-#include <cstdlib>
 
 /// Reads any bytes as a document. What reads must write, read again, and write the same bytes; and
 /// a stream that checks short reads must not read more than one that does not.
 namespace {
 
 using namespace base;
-
-void require(bool condition, const char* what) {
-    if (condition)
-        return;
-    std::fprintf(stderr, "%s\n", what);
-    std::abort();
-}
 
 bool readDocument(PluginFactory& factory, const vector<u8>& bytes, u32 flags) {
     Stream stream = memStreamView(bytes.data(), bytes.size(), "input");

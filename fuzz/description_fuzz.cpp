@@ -1,23 +1,16 @@
+#include "require.h"
+
 #include "b_attribute_desc.h"
 #include "b_exception.h"
 #include "b_log.h"
 
 #include <cstdint>
-#include <cstdio>
-#include <cstdlib>
 
 /// Reads any bytes as a description file. What it describes must be found again, its relations
 /// must agree with each other, and a second file must not change it.
 namespace {
 
 using namespace base;
-
-void require(bool condition, const char* what) {
-    if (condition)
-        return;
-    std::fprintf(stderr, "%s\n", what);
-    std::abort();
-}
 
 /// False for what is no XML.
 bool load(AttribDescManager& manager, const string& text) {

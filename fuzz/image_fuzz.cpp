@@ -1,10 +1,10 @@
+#include "require.h"
+
 #include "i_file.h"
 
 #include "stream/b_stream_workers.h"
 
 #include <algorithm>
-#include <cstdio>
-#include <cstdlib>
 
 /// Loads any bytes as a file of the format `FUZZ_FORMAT`. What loads must be whole, be what
 /// `readImageInfo` tells, and come back from a file that is written from it.
@@ -14,13 +14,6 @@ using namespace iio;
 
 constexpr base::string_view format = FUZZ_FORMAT;
 constexpr u64 greatestSavedBytes = 1 << 16; ///< of pixels; writing more is slow
-
-void require(bool condition, const char* what) {
-    if (condition)
-        return;
-    std::fprintf(stderr, "%s\n", what);
-    std::abort();
-}
 
 base::Stream view(const vector<u8>& bytes) {
     return base::memStreamView(bytes.data(), bytes.size(), base::string("input.") + FUZZ_FORMAT);

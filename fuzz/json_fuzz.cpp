@@ -1,22 +1,14 @@
+#include "require.h"
+
 #include "b_exception.h"
 #include "b_factory.h"
 #include "b_log.h"
 #include "stream/b_stream_workers.h"
 
-#include <cstdio>
-#include <cstdlib>
-
 /// Reads any text as a document. What reads must write, read again, and write the same text.
 namespace {
 
 using namespace base;
-
-void require(bool condition, const char* what) {
-    if (condition)
-        return;
-    std::fprintf(stderr, "%s\n", what);
-    std::abort();
-}
 
 bool readDocument(PluginFactory& factory, const void* text, std::size_t byteCount) {
     Stream stream = memStreamView(text, byteCount, "input");
