@@ -138,8 +138,10 @@ void Run::doStages() {
 
 /// Finds the importer and its settings.
 void Run::prepareImport() {
-    if (scene::isSceneDocument(record_.input))
+    if (scene::isSceneDocument(record_.input)) {
+        warnOfIdleOptions("importer", record_.input);
         return;
+    }
     const CrashGuard guard(record_.input);
     AttribMap& settings = record_.settings.importer;
     if (!factory_.getImporterParameters(record_.input, settings))
@@ -151,14 +153,26 @@ void Run::prepareImport() {
 
 /// Finds the exporter and its settings.
 void Run::prepareExport() {
-    if (scene::isSceneDocument(record_.output))
+    if (scene::isSceneDocument(record_.output)) {
+        warnOfIdleOptions("exporter", record_.output);
         return;
+    }
     AttribMap& settings = record_.settings.exporter;
     if (!factory_.getExporterParameters(record_.output, settings))
         throw base::exception("no plugin writes files of this kind");
     base::vector<string> errors;
     scene::applyOptions(registered_, "exporter", settings, errors);
     storeResourceFolders(options_.resourceFolders, settings);
+}
+
+/// Scene documents are read and written as they are, whatever the settings.
+void Run::warnOfIdleOptions(base::string_view group, const string& path) const {
+    for (const base::CmdLineGroup& options : registered_.groups())
+        for (const base::ref<base::CmdLineOption>& option : options.options)
+            if (options.name == group && option->seen)
+                base::log().log(base::logSystem, base::logWarning,
+                                "{}: option '{}' has no effect on a scene document.", path,
+                                option->name);
 }
 
 void Run::importScene() {

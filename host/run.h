@@ -23,6 +23,7 @@ private:
     void doStages();
     void prepareImport();
     void prepareExport();
+    void warnOfIdleOptions(base::string_view group, const base::string& path) const;
     void importScene();
     void applySceneOptions();
     void exportScene();

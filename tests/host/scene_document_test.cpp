@@ -138,6 +138,12 @@ TEST_F(SceneDocumentTest, TellsWhatIsWrongWithAnInput) {
          "json parser @/odd.scene.json| Trying to create an attribute 'root::size' from unknown "
          "type 'vec5f' at line 5!"},
         {{"--strict", "@/odd.scene.json", "@/a.glb"}, 5, "vec5f"},
+        {{"-importMeshes", "false", "@/odd.scene.json", "@/a.glb"},
+         0,
+         "@/odd.scene.json: option '-importMeshes' has no effect on a scene document."},
+        {{"-exportCompress", "false", "@/odd.scene.json", "@/b.scene"},
+         0,
+         "@/b.scene: option '-exportCompress' has no effect on a scene document."},
         {{"@/bytes.scene", "@/a.glb"}, 2, "error: @/bytes.scene: "},
         {{"@/odd.scene.json", "@/none/a.scene"}, 4, "its folder does not exist"},
         {{"@/odd.scene.json", "@/odd.scene.json"}, 1, "INPUT and OUTPUT are the same file"},
