@@ -20,9 +20,10 @@ struct Seed {
 const vector<Seed>& seeds() {
     static const vector<Seed> all = [] {
         vector<Seed> found;
-        for (const auto& entry : std::filesystem::recursive_directory_iterator(IMAGE_SEEDS))
-            if (entry.is_regular_file())
-                found.push_back({std::filesystem::relative(entry.path(), IMAGE_SEEDS).c_str()});
+        const std::filesystem::path folder = IMAGE_SEEDS;
+        for (const char* format : {"jpeg", "png", "tga"})
+            for (const auto& entry : std::filesystem::directory_iterator(folder / format))
+                found.push_back({std::filesystem::relative(entry.path(), folder).c_str()});
         return found;
     }();
     return all;
