@@ -165,19 +165,22 @@ private:
         return true;
     }
 
-    /// The text that a member stands for, in either form; empty if it is none.
-    string_view textOf(const DataMember& member) {
+    /// The text of a string, in either form; empty if the member is none.
+    string_view stringOf(const DataMember& member) {
         if (member.kind != DataKind::object)
             return member.text;
         const u32 behind = in_.place();
         in_.setPlace(member.place);
         in_.enter();
-        string_view text;
-        for (DataMember inner; in_.nextMember(inner);)
-            if (inner.name == "@value")
+        string_view type, text;
+        for (DataMember inner; in_.nextMember(inner);) {
+            if (inner.name == "@type")
+                type = inner.text;
+            else if (inner.name == "@value")
                 text = inner.text;
+        }
         in_.setPlace(behind);
-        return text;
+        return type == TypeTraits<string>::n_name.view() ? text : string_view();
     }
 
     void createObject(u32 place) {
@@ -188,7 +191,7 @@ private:
             if (member.name == "@type")
                 hasType = readNameText(&member, typeText);
             else if (member.name == "name")
-                name = textOf(member);
+                name = stringOf(member);
         }
         if (!hasType) {
             in_.setPlace(std::as_const(places_)[place]);

@@ -31,7 +31,7 @@ void writeFlags(DataWriter& out, u32 flags);
 void writeMembers(const AttribMap& map, DataWriter& out, JSONWriteOptions& options);
 
 /// The name by which others may refer to an object: that of its own attribute "name", if it is
-/// written as a plain text and can't be taken for anything else. Null without such a name.
+/// written as a text and can't be taken for anything else. Null without such a name.
 const string* plainNameOf(const IPlugin& object);
 /// True if the document has a place for `object`.
 bool isWritten(const IPlugin& object, const JSONWriteOptions& options);

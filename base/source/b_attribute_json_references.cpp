@@ -24,8 +24,7 @@ bool parseId(string_view text, u32& id) {
 const string* plainNameOf(const IPlugin& object) {
     static const name_id nameOfName = nameServer().id("name");
     const Attribute* found = object.findAttribute(nameOfName, false, false);
-    if (!found || found->type() != TypeTraits<string>::n_name ||
-        (found->flags() & (storedFlags | attribTransient)) != 0)
+    if (!found || found->type() != TypeTraits<string>::n_name || !isStored(*found))
         return nullptr;
     const auto& text = *static_cast<const string*>(found->data(-1));
     const bool isClear = !text.empty() && text != "null" && text != "~null" &&

@@ -147,13 +147,16 @@ struct EventRecorder {
     bool EndArray(rapidjson::SizeType count) { return end(count); }
 
 private:
+    static bool isOfNumber(char c) {
+        return (c >= '0' && c <= '9') || c == '.' || c == '-' || c == '+' || (c | 0x20) == 'e';
+    }
+
     /// The number that ends here, as it stands; empty for NaN and Infinity. The parser's own values
     /// are not exact, and wrong where they leave the range of double.
     string_view numberText() const {
         const std::size_t end = source.Tell();
         std::size_t start = end;
-        while (start > 0 &&
-               string_view("0123456789+-.eE").find(reader.text_[start - 1]) != string_view::npos)
+        while (start > 0 && isOfNumber(reader.text_[start - 1]))
             --start;
         return reader.text_.substr(start, end - start);
     }

@@ -180,9 +180,17 @@ TEST(JsonDocument, LongTextsComeBack) {
 TEST(JsonDocument, NamesCountInBothForms) {
     PluginFactory read;
     ASSERT_TRUE(readJsonText(read, R"({"@version": 1, "@objects": [
+        {"@type": "kind", "name": {"@type": "plugin", "@value": "gate"}},
         {"@type": "kind", "name": {"@type": "string", "@flags": 1, "@value": "gate"}},
         {"@type": "", "of": {"@type": "plugin", "@value": "gate"}}]})"));
-    EXPECT_EQ(*read.plugin(1)->findAttribute<ref<IPlugin>>(nameOf("of")), read.plugin(0));
+    EXPECT_EQ(*read.plugin(2)->findAttribute<ref<IPlugin>>(nameOf("of")), read.plugin(1));
+
+    // A name with flags makes that of another object as ambiguous as one without.
+    PluginFactory again;
+    read.plugin(2)->attribute<string>(nameOf("name")) = "gate";
+    read.plugin(2)->attribute<ref<IPlugin>>(nameOf("of")) = read.plugin(2);
+    ASSERT_TRUE(readJsonText(again, writtenJson(read)));
+    EXPECT_EQ(firstDifference(read, again), "");
 }
 
 TEST(JsonDocument, MembersComeInAnyOrder) {
